@@ -13,9 +13,10 @@
  *
  * Errors     Every operation answers a ViStatus: 0 success, positive completion codes and warnings, negative errors.
  * Time-outs  Milliseconds. Each blocking call has one deadline: VI_ATTR_TMO_VALUE, or the call's own time-out argument.
- * Threads    Any thread may call any operation. One session used by two threads is serialised; two sessions never wait
- * for each other. viClose and viTerminate from another thread wake a blocked call. Ownership  Texts and buffers belong
- * to the caller. Event contexts handed out by viWaitOnEvent, find lists and sessions are released with viClose.
+ * Threads    Any thread may call any operation. One session used by two threads is serialised; two sessions never wait for
+ *            each other. viClose and viTerminate from another thread wake a blocked call.
+ * Ownership  Texts and buffers belong to the caller. Event contexts handed out by viWaitOnEvent, find lists and sessions are
+ *            released with viClose.
  */
 #ifndef KYVISA_VISA_H
 #define KYVISA_VISA_H

@@ -27,8 +27,8 @@
 #define _VI_FUNCC
 #define _VI_FUNCH
 
-#define VI_NULL (0)
-#define VI_TRUE (1)
+#define VI_NULL  (0)
+#define VI_TRUE  (1)
 #define VI_FALSE (0)
 
 #define KYVISA_TYPE(Name, Type)                                                                                        \
