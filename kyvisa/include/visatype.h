@@ -31,52 +31,45 @@
 #define VI_TRUE  (1)
 #define VI_FALSE (0)
 
-#define KYVISA_TYPE(Name, Type)                                                                                        \
-    typedef Type Vi##Name;                                                                                             \
-    typedef Type *ViP##Name;                                                                                           \
-    typedef Type *ViA##Name
+typedef uint64_t ViUInt64, *ViPUInt64, *ViAUInt64;
+typedef int64_t ViInt64, *ViPInt64, *ViAInt64;
+typedef uint32_t ViUInt32, *ViPUInt32, *ViAUInt32;
+typedef int32_t ViInt32, *ViPInt32, *ViAInt32;
+typedef uint16_t ViUInt16, *ViPUInt16, *ViAUInt16;
+typedef int16_t ViInt16, *ViPInt16, *ViAInt16;
+typedef uint8_t ViUInt8, *ViPUInt8, *ViAUInt8;
+typedef int8_t ViInt8, *ViPInt8, *ViAInt8;
+typedef char ViChar, *ViPChar, *ViAChar;
+typedef unsigned char ViByte, *ViPByte, *ViAByte;
+typedef float ViReal32, *ViPReal32, *ViAReal32;
+typedef double ViReal64, *ViPReal64, *ViAReal64;
+typedef void *ViAddr, **ViPAddr, **ViAAddr;
 
-KYVISA_TYPE(UInt64, uint64_t);
-KYVISA_TYPE(Int64, int64_t);
-KYVISA_TYPE(UInt32, uint32_t);
-KYVISA_TYPE(Int32, int32_t);
-KYVISA_TYPE(UInt16, uint16_t);
-KYVISA_TYPE(Int16, int16_t);
-KYVISA_TYPE(UInt8, uint8_t);
-KYVISA_TYPE(Int8, int8_t);
-KYVISA_TYPE(Char, char);
-KYVISA_TYPE(Byte, unsigned char);
-KYVISA_TYPE(Real32, float);
-KYVISA_TYPE(Real64, double);
-KYVISA_TYPE(Addr, void *);
-
-KYVISA_TYPE(Boolean, ViUInt16);
-KYVISA_TYPE(Status, ViInt32);
-KYVISA_TYPE(Version, ViUInt32);
-KYVISA_TYPE(Object, ViUInt32);
-KYVISA_TYPE(Session, ViUInt32);
-KYVISA_TYPE(Event, ViUInt32);
-KYVISA_TYPE(FindList, ViUInt32);
-KYVISA_TYPE(Attr, ViUInt32);
-KYVISA_TYPE(EventType, ViUInt32);
-KYVISA_TYPE(EventFilter, ViUInt32);
-KYVISA_TYPE(JobId, ViUInt32);
-KYVISA_TYPE(AccessMode, ViUInt32);
-KYVISA_TYPE(BusAddress64, ViUInt64);
-KYVISA_TYPE(BusSize64, ViUInt64);
+typedef ViUInt16 ViBoolean, *ViPBoolean, *ViABoolean;
+typedef ViInt32 ViStatus, *ViPStatus, *ViAStatus;
+typedef ViUInt32 ViVersion, *ViPVersion, *ViAVersion;
+typedef ViUInt32 ViObject, *ViPObject, *ViAObject;
+typedef ViUInt32 ViSession, *ViPSession, *ViASession;
+typedef ViUInt32 ViEvent, *ViPEvent, *ViAEvent;
+typedef ViUInt32 ViFindList, *ViPFindList, *ViAFindList;
+typedef ViUInt32 ViAttr, *ViPAttr, *ViAAttr;
+typedef ViUInt32 ViEventType, *ViPEventType, *ViAEventType;
+typedef ViUInt32 ViEventFilter, *ViPEventFilter, *ViAEventFilter;
+typedef ViUInt32 ViJobId, *ViPJobId, *ViAJobId;
+typedef ViUInt32 ViAccessMode, *ViPAccessMode, *ViAAccessMode;
+typedef ViUInt64 ViBusAddress64, *ViPBusAddress64, *ViABusAddress64;
+typedef ViUInt64 ViBusSize64, *ViPBusSize64, *ViABusSize64;
 
 #if defined(VI_ENV_64_BIT)
-KYVISA_TYPE(BusAddress, ViUInt64);
-KYVISA_TYPE(BusSize, ViUInt64);
+typedef ViUInt64 ViBusAddress, *ViPBusAddress, *ViABusAddress;
+typedef ViUInt64 ViBusSize, *ViPBusSize, *ViABusSize;
 typedef ViUInt64 ViAttrState;
 #else
-KYVISA_TYPE(BusAddress, ViUInt32);
-KYVISA_TYPE(BusSize, ViUInt32);
+typedef ViUInt32 ViBusAddress, *ViPBusAddress, *ViABusAddress;
+typedef ViUInt32 ViBusSize, *ViPBusSize, *ViABusSize;
 typedef ViUInt32 ViAttrState;
 #endif
 typedef void *ViPAttrState;
-
-#undef KYVISA_TYPE
 
 typedef ViByte *ViBuf;
 typedef ViByte *ViPBuf;
