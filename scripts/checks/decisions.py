@@ -1,0 +1,26 @@
+#!/usr/bin/env python3
+"""Checks that every page in docs/decisions/ names a test that exists.
+
+A page carries one or more lines `Test: NAME`, with NAME as ctest lists it. Usage: decisions.py BUILD_FOLDER [ROOT].
+"""
+import pathlib
+import re
+import subprocess
+import sys
+
+BUILD = sys.argv[1]
+ROOT = pathlib.Path(sys.argv[2] if len(sys.argv) > 2 else pathlib.Path(__file__).resolve().parents[2])
+
+listing = subprocess.run(["ctest", "--test-dir", BUILD, "-N"], capture_output=True, text=True, check=True).stdout
+tests = set(re.findall(r"Test\s+#\d+: (\S+)", listing))
+
+findings = []
+pages = sorted(p for p in (ROOT / "docs" / "decisions").glob("*.md") if p.name != "README.md")
+for page in pages:
+    named = re.findall(r"^Test: +`?([^`\s]+)`?", page.read_text(encoding="utf-8"), re.M)
+    if not named:
+        findings.append(f"{page.name}: names no test")
+    findings += [f"{page.name}: there is no test {name}" for name in named if name not in tests]
+
+print("\n".join(findings) if findings else f"{len(pages)} decisions, each with its test")
+sys.exit(1 if findings else 0)
