@@ -3,6 +3,9 @@ tester_library(tester-base
     app/Data.h
     log/FastBuffer.h
     panels/Subject.cpp
+    pipeline/VisaError.cpp
     pipeline/VisaFunctionCall.cpp
     pipeline/VisaFunctionCallParameter.cpp
+    visa/KyVisaCodedString.cpp
+    visa/KyVisaNames.cpp
 )

@@ -1,0 +1,8 @@
+#include "pipeline/VisaError.h"
+
+#include "visa/KyVisaNames.h"
+
+const char *VisaError::StatusCode(int status)
+{
+    return KyVisaStatusToString(status);
+}
