@@ -11,10 +11,15 @@
 #include <cstdint>
 
 /**
- * The bounded queue between the threads that log and the thread that writes the log file.
+ * The bounded queue between the threads that log and the thread that writes the log file. Several producers, one
+ * consumer.
  *
- * Full: push() waits until the writer has taken a line; nothing is dropped. Stopped: pop() answers false at once, lines
- * that still wait are dropped, and push() never blocks again. Several producers, one consumer.
+ * Full: push() waits, holding the producers' mutex, until the writer has taken a line; nothing is dropped.
+ * Stopped, for good: pop() answers false at once, lines that still wait are dropped, producers that wait wake up, and
+ * push() never blocks again. It stores while there is room, although nobody will read it.
+ *
+ * The semaphores order the hand-over of a slot: a producer fills it before it releases "used", the consumer has copied it
+ * before it releases "free".
  */
 class MessageQueue
 {
@@ -27,16 +32,16 @@ public:
     MessageQueue(const MessageQueue &) = delete;
     MessageQueue &operator=(const MessageQueue &) = delete;
 
-    bool push(const FastBuffer &line);
-    bool pop(FastBuffer &line);
+    bool push(const FastBuffer &line); ///< always true
+    bool pop(FastBuffer &line);        ///< false once the queue is stopped
     void stop();
 
 private:
     std::array<FastBuffer, Slots> m_ring;
-    std::uint32_t m_write = 0;
-    std::uint32_t m_read = 0;
+    std::uint32_t m_write = 0;            ///< guarded by m_mutex
+    std::atomic<std::uint32_t> m_read{0}; ///< the consumer's; producers look at it once stopped
     std::atomic<bool> m_stopped{false};
     QSemaphore m_free;
     QSemaphore m_used;
-    pthread_mutex_t m_mutex;
+    pthread_mutex_t m_mutex; ///< process-shared; serialises producers
 };

@@ -10,15 +10,21 @@
 /**
  * The ring of recent lines that the live view polls. Never blocks and never refuses: old lines are overwritten.
  *
- * Any thread adds, the user-interface thread copies. One mutex serves all rings of the process.
+ * Any thread adds, the user-interface thread copies. One mutex serves all rings of the process; when it cannot be locked,
+ * the operation throws std::system_error.
+ *
+ * A ring is 4 MB of slots that are touched only as lines come in.
  */
 class StringMessageQueue
 {
 public:
     static constexpr unsigned Capacity = 8192;
 
+    StringMessageQueue();
+
+    /// Ignores a null @p line.
     void addMessage(const FastBuffer *line);
-    /// Copies the newest min(held, @p max) lines to @p dest, oldest first; returns how many.
+    /// Copies the newest min(held, @p max) lines to @p dest, oldest first; returns how many. A null @p dest gets none.
     unsigned copyFromQueue(FastBuffer *dest, unsigned max);
     /// Lines ever added; clear() does not reset it.
     std::uint64_t getLines() const { return m_lines.load(std::memory_order_relaxed); }
