@@ -2,12 +2,29 @@
 
 #include <gtest/gtest.h>
 
+#include <dlfcn.h>
+#include <pthread.h>
+
 #include <atomic>
 #include <chrono>
 #include <functional>
 #include <memory>
 #include <thread>
 #include <vector>
+
+namespace
+{
+thread_local int lastSharing = -1; // process sharing of the last mutex made on this thread
+}
+
+/// Notes how a mutex is made, then makes it.
+extern "C" int pthread_mutex_init(pthread_mutex_t *mutex, const pthread_mutexattr_t *attributes) noexcept
+{
+    if (attributes)
+        pthread_mutexattr_getpshared(attributes, &lastSharing);
+    using Init = int (*)(pthread_mutex_t *, const pthread_mutexattr_t *);
+    return reinterpret_cast<Init>(dlsym(RTLD_NEXT, "pthread_mutex_init"))(mutex, attributes);
+}
 
 namespace
 {
@@ -128,6 +145,7 @@ TEST_F(FileQueue, StopWakesAHundredWaitingProducersAndMore)
     push(1, 16383);
     std::atomic<int> through{0};
     std::vector<std::thread> producers;
+    producers.reserve(130);
     for (int i = 0; i < 130; ++i) {
         producers.emplace_back([&] {
             push(1, 1);
@@ -145,6 +163,13 @@ TEST_F(FileQueue, NeverBlocksAProducerOnceItIsStopped)
     m_queue->stop();
     push(1, 40000);
     SUCCEED();
+}
+
+TEST_F(FileQueue, MakesItsMutexShareableBetweenProcesses)
+{
+    lastSharing = -1;
+    const auto queue = std::make_unique<MessageQueue>();
+    EXPECT_EQ(lastSharing, PTHREAD_PROCESS_SHARED);
 }
 
 TEST_F(FileQueue, EndsWithLinesInIt)
