@@ -12,7 +12,7 @@ class VisaFunctionCallCreator : public _VisaFunctionCallHandlerListener
 public:
     explicit VisaFunctionCallCreator(VisaFunctionCallHandler *handler);
 
-    /// Adds the source of the next slot. False when all three are set.
+    /// Adds the source of the next slot (not owned; null leaves the slot empty). False when all three are set.
     bool setParameter(VisaFunctionCallParameter *parameter);
     void setType(VisaFunctionCallTyp type);
     void setLock(bool lock);

@@ -9,7 +9,6 @@
 #include <array>
 #include <atomic>
 #include <list>
-#include <memory>
 #include <mutex>
 #include <vector>
 
@@ -27,6 +26,10 @@ class VisaDispatcher;
  * in it. The handler is therefore large and lives on the heap.
  *
  * close() is final: takers wake and get false, results are dropped, a producer that waits for room gives up.
+ *
+ * Listeners come and go on the user-interface thread, also in the middle of a delivery and while results are being
+ * distributed: one that was detached is blanked in the copies that still wait and gets no new ones. The dispatcher and
+ * every producer's thread outlive their use of the handler: end the worker before destroying it.
  */
 class VisaFunctionCallHandler
 {
@@ -59,4 +62,31 @@ public:
     bool removeVisaFunctionCallListener(_VisaFunctionCallHandlerListener *listener, VisaFunctionCallTyp type);
 
     void close();
+
+private:
+    bool isRegistered(const _VisaFunctionCallHandlerListener *listener, VisaFunctionCallTyp type) const;
+    bool distribute(const _visaFunctionCall &call, VisaFunctionCallTyp listenersOf);
+    void wakeDispatcher();
+    void blankWaitingResults(const _VisaFunctionCallHandlerListener *listener);
+
+    std::atomic<bool> m_lock{false};                                        ///< a locking request is outstanding
+    std::list<_VisaFunctionCallHandlerListener *> m_handlerListeners;       ///< not owned, in order of attachment
+    std::vector<std::list<_VisaFunctionCallHandlerListener *>> m_listeners; ///< not owned, by kind
+    /// Guards m_listeners against the threads that distribute. Never held while waiting or calling out.
+    mutable std::mutex m_listenersMutex;
+
+    std::array<_visaFunctionCall, RequestCapacity> m_calls;
+    unsigned m_callWrite = 0;
+    unsigned m_callRead = 0;
+    std::atomic<unsigned> m_callCount{0};
+
+    std::array<finsihedFunctionCall, ResultCapacity> m_finished;
+    unsigned m_finishedWrite = 0;
+    unsigned m_finishedRead = 0;
+    std::atomic<unsigned> m_finishedCount{0};
+
+    VisaDispatcher *m_dispatcher;    ///< not owned; without one, results wait until they are taken
+    QSemaphore m_callSemaphore;      ///< one permit a queued request
+    pthread_mutex_t m_finishedMutex; ///< process-shared; serialises the producers of results
+    std::atomic<bool> m_closed{false};
 };

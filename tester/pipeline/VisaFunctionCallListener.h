@@ -53,5 +53,7 @@ protected:
     ~VisaFunctionCallListener();
 
 private:
-    std::vector<VisaFunctionCallTyp> m_types;
+    void unregister();
+
+    std::vector<VisaFunctionCallTyp> m_types; ///< in order; kept without a handler, for the next one
 };
