@@ -1,0 +1,20 @@
+tester_library(tester-panels
+  SOURCES
+    panels/BasicTab.cpp
+    panels/ComboBoxParamerter.cpp
+    panels/EventComboBox.cpp
+    panels/ExprLineEdit.cpp
+    panels/GpibAtnComboBox.cpp
+    panels/GpibRenComboBox.cpp
+    panels/LineEditAttribute.cpp
+    panels/LineEditParameter.cpp
+    panels/MechanismFrame.cpp
+    panels/ObserverLineEdit.cpp
+    panels/OpenModeParameter.cpp
+    panels/ResourceFrame.cpp
+    panels/ResourceName.cpp
+    panels/ScipiLineEdit.cpp
+    panels/SpinBoxParameter.cpp
+    panels/StatusLabel.cpp
+  LIBRARIES tester-pipeline tester-log tester-base Qt5::Widgets
+)
