@@ -131,6 +131,13 @@ void reset()
     state.clear();
 }
 
+void forgetCalls()
+{
+    State &state = State::instance();
+    const std::lock_guard lock(state.mutex);
+    state.calls.clear();
+}
+
 void script(const std::string &operation, Answer answer)
 {
     State &state = State::instance();

@@ -80,6 +80,9 @@ struct Resource {
 /// Back to a friendly instrument with nothing scripted, recorded or open.
 void reset();
 
+/// Forgets the calls recorded so far and nothing else.
+void forgetCalls();
+
 /// Queues an answer for the next call of @p operation that finds none queued before it.
 void script(const std::string &operation, Answer answer);
 /// Answers of @p operation that no call has taken yet.
