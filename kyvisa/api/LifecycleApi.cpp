@@ -1,0 +1,81 @@
+#include "kyvisa/api/Entry.h"
+#include "kyvisa/core/FindList.h"
+
+using namespace kyvisa;
+using namespace kyvisa::api;
+
+ViStatus viOpenDefaultRM(ViPSession sesn)
+{
+    return guarded([&]() -> ViStatus {
+        if (!sesn)
+            return VI_ERROR_INV_PARAMETER;
+        *sesn = VI_NULL;
+        Library &library = Library::instance();
+        const auto manager = std::make_shared<ResourceManager>(library);
+        const ViSession handle = library.handles.insert(manager, VI_NULL);
+        if (handle == 0)
+            return VI_ERROR_ALLOC;
+        manager->setHandle(handle);
+        *sesn = handle;
+        return VI_SUCCESS;
+    });
+}
+
+ViStatus viGetDefaultRM(ViPSession sesn)
+{
+    return viOpenDefaultRM(sesn);
+}
+
+ViStatus viOpen(ViSession sesn, ViConstRsrc name, ViAccessMode mode, ViUInt32 timeout, ViPSession vi)
+{
+    return onResourceManager(sesn, [&](ResourceManager &manager) -> ViStatus {
+        return vi ? manager.open(name, mode, timeout, *vi) : VI_ERROR_INV_PARAMETER;
+    });
+}
+
+ViStatus viClose(ViObject vi)
+{
+    if (vi == VI_NULL)
+        return VI_WARN_NULL_OBJECT;
+    return guarded([&]() -> ViStatus {
+        const ObjectPointer object = Library::instance().handles.remove(vi);
+        if (!object)
+            return VI_ERROR_INV_OBJECT;
+        if (object->inherited() && object->asInstrument()) {
+            object->abandon();
+            return VI_SUCCESS;
+        }
+        return object->close();
+    });
+}
+
+ViStatus viFindRsrc(ViSession sesn, ViConstString expr, ViPFindList findList, ViPUInt32 retCnt, ViChar desc[])
+{
+    return onResourceManager(
+        sesn, [&](ResourceManager &manager) { return manager.findResources(expr, findList, retCnt, desc); });
+}
+
+ViStatus viFindNext(ViFindList findList, ViChar desc[])
+{
+    return onObject(findList, [&](Object &object) -> ViStatus {
+        FindList *list = object.asFindList();
+        if (!list)
+            return VI_ERROR_NSUP_OPER;
+        return desc ? list->next(desc) : VI_ERROR_INV_PARAMETER;
+    });
+}
+
+ViStatus viParseRsrc(ViSession sesn, ViConstRsrc rsrcName, ViPUInt16 intfType, ViPUInt16 intfNum)
+{
+    return viParseRsrcEx(sesn, rsrcName, intfType, intfNum, nullptr, nullptr, nullptr);
+}
+
+ViStatus viParseRsrcEx(ViSession sesn, ViConstRsrc rsrcName, ViPUInt16 intfType, ViPUInt16 intfNum, ViChar rsrcClass[],
+                       ViChar expandedUnaliasedName[], ViChar aliasIfExists[])
+{
+    return onResourceManager(sesn, [&](ResourceManager &manager) -> ViStatus {
+        if (!intfType || !intfNum)
+            return VI_ERROR_INV_PARAMETER;
+        return manager.parse(rsrcName, *intfType, *intfNum, rsrcClass, expandedUnaliasedName, aliasIfExists);
+    });
+}

@@ -1,0 +1,348 @@
+#include "kyvisa/core/EventHub.h"
+
+#include "kyvisa/include/visa.h"
+#include "kyvisa/os/Deadline.h"
+
+#include <algorithm>
+#include <chrono>
+#include <system_error>
+
+namespace kyvisa
+{
+namespace
+{
+
+constexpr ViUInt16 CallbackModes = VI_HNDLR | VI_SUSPEND_HNDLR;
+constexpr std::chrono::seconds PatienceWithHandlers{5};
+
+bool validToEnable(ViUInt16 mechanism)
+{
+    const bool known = mechanism != 0 && (mechanism & ~(VI_QUEUE | CallbackModes)) == 0;
+    return known && (mechanism & CallbackModes) != CallbackModes;
+}
+
+bool validToDisable(ViUInt16 mechanism)
+{
+    return mechanism == VI_ALL_MECH || (mechanism != 0 && (mechanism & ~(VI_QUEUE | CallbackModes)) == 0);
+}
+
+bool validToDiscard(ViUInt16 mechanism)
+{
+    return mechanism == VI_ALL_MECH || (mechanism != 0 && (mechanism & ~(VI_QUEUE | VI_SUSPEND_HNDLR)) == 0);
+}
+
+bool matches(ViEventType wanted, ViEventType type)
+{
+    return wanted == VI_ALL_ENABLED_EVENTS || wanted == type;
+}
+
+} // namespace
+
+EventHub::EventHub(std::span<const ViEventType> types, Contexts contexts) : m_contexts(std::move(contexts))
+{
+    for (const ViEventType type : types.first(std::min(types.size(), m_states.size())))
+        m_states[m_stateCount++].type = type;
+}
+
+EventHub::TypeState *EventHub::stateOf(ViEventType type)
+{
+    for (TypeState &state : states())
+        if (state.type == type)
+            return &state;
+    return nullptr;
+}
+
+bool EventHub::possible(ViEventType type) const
+{
+    return std::any_of(m_states.begin(), m_states.begin() + static_cast<std::ptrdiff_t>(m_stateCount),
+                       [type](const TypeState &state) { return state.type == type; });
+}
+
+bool EventHub::setQueueLength(ViUInt32 length)
+{
+    const std::lock_guard lock(m_mutex);
+    if (m_everEnabled)
+        return false;
+    m_queueLength = length;
+    return true;
+}
+
+ViStatus EventHub::enableOne(TypeState &state, ViUInt16 mechanism, std::vector<Event> &pending)
+{
+    if (state.type == VI_EVENT_EXCEPTION && mechanism != VI_HNDLR)
+        return VI_ERROR_NSUP_MECH;
+    if ((mechanism & VI_HNDLR) != 0 && state.handlers.empty())
+        return VI_ERROR_HNDLR_NINSTALLED;
+    if ((mechanism & VI_HNDLR) != 0 && state.type != VI_EVENT_EXCEPTION && !startHandlerThread())
+        return VI_ERROR_ALLOC;
+
+    const bool already = (state.mechanisms & mechanism) != 0;
+    if ((mechanism & CallbackModes) != 0)
+        state.mechanisms &= static_cast<ViUInt16>(~CallbackModes);
+    state.mechanisms |= mechanism;
+    m_everEnabled = true;
+    if ((mechanism & VI_HNDLR) != 0) {
+        std::copy_if(m_suspended.begin(), m_suspended.end(), std::back_inserter(pending),
+                     [&](const Event &event) { return event.type == state.type; });
+        std::erase_if(m_suspended, [&](const Event &event) { return event.type == state.type; });
+    }
+    return already ? VI_SUCCESS_EVENT_EN : VI_SUCCESS;
+}
+
+ViStatus EventHub::enable(ViEventType type, ViUInt16 mechanism, ViEventFilter filter)
+{
+    std::vector<Event> pending;
+    ViStatus status = VI_SUCCESS;
+    {
+        const std::lock_guard lock(m_mutex);
+        TypeState *only = stateOf(type);
+        if (!only && type != VI_ALL_ENABLED_EVENTS)
+            return VI_ERROR_INV_EVENT;
+        if (!validToEnable(mechanism))
+            return VI_ERROR_INV_MECH;
+        if (filter != 0)
+            return VI_ERROR_INV_CONTEXT;
+        for (TypeState &state : states()) {
+            const bool chosen = only ? &state == only : state.mechanisms != 0 && state.type != VI_EVENT_EXCEPTION;
+            if (!chosen)
+                continue;
+            const ViStatus one = enableOne(state, mechanism, pending);
+            if (one < VI_SUCCESS || status == VI_SUCCESS)
+                status = one;
+            if (one < VI_SUCCESS)
+                break;
+        }
+    }
+    // Those that waited while the handlers were suspended reach them before this call returns.
+    for (const Event &event : pending)
+        callHandlers(event);
+    return status;
+}
+
+ViStatus EventHub::disable(ViEventType type, ViUInt16 mechanism)
+{
+    const std::lock_guard lock(m_mutex);
+    TypeState *only = stateOf(type);
+    if (!only && type != VI_ALL_ENABLED_EVENTS)
+        return VI_ERROR_INV_EVENT;
+    if (!validToDisable(mechanism))
+        return VI_ERROR_INV_MECH;
+    // Both callback modes are one mechanism: asking for either ends whichever is on.
+    ViUInt16 ended = mechanism;
+    if ((ended & CallbackModes) != 0)
+        ended |= CallbackModes;
+
+    bool someWereOff = false;
+    for (TypeState &state : states()) {
+        if (only && &state != only)
+            continue;
+        const bool queueAsked = (ended & VI_QUEUE) != 0;
+        const bool callbackAsked = (ended & CallbackModes) != 0;
+        const bool queueOff = (state.mechanisms & VI_QUEUE) == 0;
+        const bool callbackOff = (state.mechanisms & CallbackModes) == 0;
+        if (mechanism == VI_ALL_MECH)
+            someWereOff |= only && queueOff && callbackOff;
+        else
+            someWereOff |= only && ((queueAsked && queueOff) || (callbackAsked && callbackOff));
+        state.mechanisms &= static_cast<ViUInt16>(~ended);
+    }
+    m_changed.notify_all();
+    return someWereOff ? VI_SUCCESS_EVENT_DIS : VI_SUCCESS;
+}
+
+ViStatus EventHub::discard(ViEventType type, ViUInt16 mechanism)
+{
+    const std::lock_guard lock(m_mutex);
+    if (!stateOf(type) && type != VI_ALL_ENABLED_EVENTS)
+        return VI_ERROR_INV_EVENT;
+    if (!validToDiscard(mechanism))
+        return VI_ERROR_INV_MECH;
+    std::size_t dropped = 0;
+    const auto drop = [&](Queue &queue) {
+        dropped += std::erase_if(queue, [type](const Event &event) { return matches(type, event.type); });
+    };
+    if ((mechanism & VI_QUEUE) != 0)
+        drop(m_queue);
+    if ((mechanism & VI_SUSPEND_HNDLR) != 0)
+        drop(m_suspended);
+    return dropped == 0 ? VI_SUCCESS_QUEUE_EMPTY : VI_SUCCESS;
+}
+
+bool EventHub::isQueued(ViEventType type) const
+{
+    return std::any_of(m_queue.begin(), m_queue.end(),
+                       [type](const Event &event) { return matches(type, event.type); });
+}
+
+bool EventHub::takeQueued(ViEventType type, Event &event)
+{
+    const auto oldest = std::find_if(m_queue.begin(), m_queue.end(),
+                                     [type](const Event &queued) { return matches(type, queued.type); });
+    if (oldest == m_queue.end())
+        return false;
+    event = *oldest;
+    m_queue.erase(oldest);
+    return true;
+}
+
+bool EventHub::anyEnabled(ViEventType type, ViUInt16 mechanism)
+{
+    return std::any_of(states().begin(), states().end(), [&](const TypeState &state) {
+        return matches(type, state.type) && (state.mechanisms & mechanism) != 0;
+    });
+}
+
+ViStatus EventHub::wait(ViEventType type, ViUInt32 timeout, Event &event)
+{
+    const os::Deadline deadline = os::Deadline::afterVisaTimeout(timeout);
+    std::unique_lock lock(m_mutex);
+    if (!stateOf(type) && type != VI_ALL_ENABLED_EVENTS)
+        return VI_ERROR_INV_EVENT;
+    const bool ended = os::waitUntil(m_changed, lock, deadline,
+                                     [&] { return m_closed || isQueued(type) || !anyEnabled(type, VI_QUEUE); });
+    if (m_closed)
+        return VI_ERROR_INV_OBJECT;
+    if (!ended)
+        return VI_ERROR_TMO;
+    if (!takeQueued(type, event))
+        return VI_ERROR_NENABLED;
+    TypeState &state = *stateOf(event.type);
+    if (state.overflowed) {
+        state.overflowed = false;
+        return VI_WARN_QUEUE_OVERFLOW;
+    }
+    return isQueued(type) ? VI_SUCCESS_QUEUE_NEMPTY : VI_SUCCESS;
+}
+
+ViStatus EventHub::install(ViEventType type, ViHndlr handler, ViAddr userHandle)
+{
+    const std::lock_guard lock(m_mutex);
+    TypeState *state = stateOf(type);
+    if (!state)
+        return VI_ERROR_INV_EVENT;
+    if (!handler)
+        return VI_ERROR_INV_HNDLR_REF;
+    state->handlers.push_back({handler, userHandle});
+    return VI_SUCCESS;
+}
+
+ViStatus EventHub::uninstall(ViEventType type, ViHndlr handler, ViAddr userHandle)
+{
+    const std::lock_guard lock(m_mutex);
+    TypeState *state = stateOf(type);
+    if (!state)
+        return VI_ERROR_INV_EVENT;
+    if (state->handlers.empty())
+        return VI_ERROR_HNDLR_NINSTALLED;
+    const std::size_t removed = std::erase_if(state->handlers, [&](const Handler &installed) {
+        return installed.userHandle == userHandle && (!handler || installed.function == handler);
+    });
+    if (removed == 0)
+        return VI_ERROR_INV_HNDLR_REF;
+    if (state->handlers.empty())
+        state->mechanisms &= static_cast<ViUInt16>(~CallbackModes);
+    return VI_SUCCESS;
+}
+
+bool EventHub::append(Queue &queue, const Event &event)
+{
+    const auto sameType =
+        std::count_if(queue.begin(), queue.end(), [&](const Event &queued) { return queued.type == event.type; });
+    if (static_cast<ViUInt64>(sameType) >= m_queueLength)
+        return false;
+    queue.push_back(event);
+    return true;
+}
+
+void EventHub::post(const Event &event)
+{
+    const std::lock_guard lock(m_mutex);
+    TypeState *state = stateOf(event.type);
+    if (!state || m_closed)
+        return;
+    if ((state->mechanisms & VI_QUEUE) != 0 && !append(m_queue, event))
+        state->overflowed = true;
+    if ((state->mechanisms & VI_HNDLR) != 0)
+        append(m_forHandlers, event);
+    if ((state->mechanisms & VI_SUSPEND_HNDLR) != 0)
+        append(m_suspended, event);
+    m_changed.notify_all();
+}
+
+void EventHub::raiseException(const Event &event)
+{
+    {
+        const std::lock_guard lock(m_mutex);
+        const TypeState *state = stateOf(VI_EVENT_EXCEPTION);
+        if (m_closed || !state || (state->mechanisms & VI_HNDLR) == 0)
+            return;
+    }
+    callHandlers(event);
+}
+
+bool EventHub::startHandlerThread()
+{
+    if (m_handlerThreadStarted)
+        return true;
+    try {
+        std::thread([self = shared_from_this()] { self->runHandlers(); }).detach();
+    } catch (const std::system_error &) {
+        return false;
+    }
+    m_handlerThreadStarted = true;
+    return true;
+}
+
+void EventHub::runHandlers()
+{
+    std::unique_lock lock(m_mutex);
+    m_handlerThread = std::this_thread::get_id();
+    for (;;) {
+        m_changed.wait(lock, [this] { return m_closed || !m_forHandlers.empty(); });
+        if (m_closed)
+            return;
+        const Event event = m_forHandlers.front();
+        m_forHandlers.pop_front();
+        m_handlerRunning = true;
+        lock.unlock();
+        try {
+            callHandlers(event);
+        } catch (...) {
+            // Out of memory, or a handler that let an exception out: the event is lost, the program goes on.
+        }
+        lock.lock();
+        m_handlerRunning = false;
+        m_changed.notify_all();
+    }
+}
+
+void EventHub::callHandlers(const Event &event)
+{
+    std::vector<Handler> handlers;
+    {
+        const std::lock_guard lock(m_mutex);
+        if (const TypeState *state = stateOf(event.type))
+            handlers = state->handlers;
+    }
+    const ViEvent context = m_contexts.make(event);
+    if (context == 0)
+        return;
+    for (auto handler = handlers.rbegin(); handler != handlers.rend(); ++handler)
+        if (handler->function(m_session, event.type, context, handler->userHandle) == VI_SUCCESS_NCHAIN)
+            break;
+    m_contexts.close(context);
+}
+
+void EventHub::close()
+{
+    std::unique_lock lock(m_mutex);
+    m_closed = true;
+    m_queue.clear();
+    m_suspended.clear();
+    m_forHandlers.clear();
+    m_changed.notify_all();
+    if (m_handlerThread != std::this_thread::get_id())
+        os::waitUntil(m_changed, lock, os::Deadline::after(PatienceWithHandlers), [this] { return !m_handlerRunning; });
+}
+
+} // namespace kyvisa

@@ -1,0 +1,106 @@
+#pragma once
+
+#include "kyvisa/core/Event.h"
+#include "kyvisa/include/visatype.h"
+
+#include <array>
+#include <condition_variable>
+#include <deque>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <span>
+#include <thread>
+#include <vector>
+
+namespace kyvisa
+{
+
+/**
+ * The events of one session: what is enabled, what is queued, who is called.
+ *
+ * post() may come from any thread. Handlers of events run one after another on a thread that the hub starts when the
+ * first handler is enabled; those of VI_EVENT_EXCEPTION run on the thread that failed. No lock of the library is held
+ * while a handler runs: it may do anything, also close the session.
+ *
+ * Each queue holds VI_ATTR_MAX_QUEUE_LENGTH events of a type. A new event that finds its queue full is dropped, and the
+ * next viWaitOnEvent for the type says so.
+ */
+class EventHub : public std::enable_shared_from_this<EventHub>
+{
+public:
+    /// Makes and closes the context of an event: the hub knows nothing of handles.
+    struct Contexts {
+        std::function<ViEvent(const Event &)> make;
+        std::function<void(ViEvent)> close;
+    };
+
+    /// @param types the events that are possible on the session, at most three.
+    EventHub(std::span<const ViEventType> types, Contexts contexts);
+
+    /// The handle that handlers are told. Before anything is enabled.
+    void setSession(ViSession session) { m_session = session; }
+
+    ViStatus enable(ViEventType type, ViUInt16 mechanism, ViEventFilter filter);
+    ViStatus disable(ViEventType type, ViUInt16 mechanism);
+    ViStatus discard(ViEventType type, ViUInt16 mechanism);
+    /// Takes the oldest event of @p type into @p event when the status is not negative.
+    ViStatus wait(ViEventType type, ViUInt32 timeout, Event &event);
+    ViStatus install(ViEventType type, ViHndlr handler, ViAddr userHandle);
+    ViStatus uninstall(ViEventType type, ViHndlr handler, ViAddr userHandle);
+
+    void post(const Event &event);
+    /// Calls the exception handlers, here and now, when they are enabled.
+    void raiseException(const Event &event);
+
+    bool possible(ViEventType type) const;
+    /// False once something was enabled: the length of the queue is fixed from then on.
+    bool setQueueLength(ViUInt32 length);
+
+    /// Wakes who waits, drops what is queued. A handler that is running is given five seconds to return, unless the
+    /// caller is that handler.
+    void close();
+
+private:
+    struct Handler {
+        ViHndlr function;
+        ViAddr userHandle;
+    };
+    struct TypeState {
+        ViEventType type = 0;
+        ViUInt16 mechanisms = 0;
+        bool overflowed = false;
+        std::vector<Handler> handlers;
+    };
+    using Queue = std::deque<Event>;
+
+    TypeState *stateOf(ViEventType type);
+    std::span<TypeState> states() { return {m_states.data(), m_stateCount}; }
+    bool append(Queue &queue, const Event &event);
+    ViStatus enableOne(TypeState &state, ViUInt16 mechanism, std::vector<Event> &pending);
+    bool takeQueued(ViEventType type, Event &event);
+    bool isQueued(ViEventType type) const;
+    bool anyEnabled(ViEventType type, ViUInt16 mechanism);
+    bool startHandlerThread();
+    void runHandlers();
+    void callHandlers(const Event &event);
+
+    const Contexts m_contexts;
+    ViSession m_session = 0;
+
+    std::mutex m_mutex;
+    std::condition_variable m_changed;
+    std::array<TypeState, 3> m_states;
+    std::size_t m_stateCount = 0;
+    ViUInt32 m_queueLength = 50;
+    bool m_everEnabled = false;
+    bool m_closed = false;
+    Queue m_queue;
+    Queue m_suspended;
+    Queue m_forHandlers;
+    bool m_handlerThreadStarted = false;
+    bool m_handlerRunning = false;
+    std::thread::id m_handlerThread;
+};
+
+} // namespace kyvisa

@@ -1,0 +1,45 @@
+#include "kyvisa/transport/TransportFactory.h"
+
+#include "kyvisa/core/AttributeTable.h"
+#include "kyvisa/include/visa.h"
+#include "kyvisa/transport/Transport.h"
+#include "wire/Hislip.h"
+
+namespace kyvisa
+{
+
+ResourceName withTransportChosen(ResourceName name)
+{
+    const bool lanInstrument = name.interfaceType == VI_INTF_TCPIP && name.resourceClass == ResourceName::Class::Instr;
+    if (lanInstrument && !name.deviceNameGiven) {
+        name.deviceName = "hislip0";
+        name.port = wire::hislip::DefaultPort;
+    }
+    return name;
+}
+
+std::uint16_t sessionKind(const ResourceName &name, ViStatus &status)
+{
+    status = VI_SUCCESS;
+    if (name.secure) {
+        status = VI_ERROR_INV_PROT;
+    } else if (name.interfaceType != VI_INTF_TCPIP) {
+        status = VI_ERROR_INTF_NUM_NCONFIG;
+    } else if (name.resourceClass == ResourceName::Class::Socket) {
+        return kind::Socket;
+    } else if (name.resourceClass != ResourceName::Class::Instr) {
+        status = VI_ERROR_RSRC_NFOUND;
+    } else if (name.isHislip()) {
+        return kind::Hislip;
+    } else {
+        status = VI_ERROR_LIBRARY_NFOUND;
+    }
+    return 0;
+}
+
+ViStatus openTransport(const ResourceName &, const os::WaitLimit &, AttributeStore &, std::unique_ptr<Transport> &)
+{
+    return VI_ERROR_LIBRARY_NFOUND;
+}
+
+} // namespace kyvisa
