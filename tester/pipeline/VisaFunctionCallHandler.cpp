@@ -3,9 +3,12 @@
 #include "pipeline/VisaDispatcher.h"
 #include "pipeline/VisaFunctionCallListener.h"
 
+#include <visa.h>
+
 #include <QVarLengthArray>
 
 #include <algorithm>
+#include <new>
 #include <thread>
 #include <utility>
 
@@ -46,6 +49,17 @@ Snapshot copyOf(const std::list<_VisaFunctionCallHandlerListener *> &listeners, 
     for (auto *listener : listeners)
         snapshot.append(listener);
     return snapshot;
+}
+/// A result that does not fit into memory once more is delivered as a failure without texts, rather than not at all.
+void copyResult(const _visaFunctionCall &from, _visaFunctionCall &to)
+{
+    try {
+        to = from;
+    } catch (const std::bad_alloc &) {
+        to = {};
+        to.type = from.type;
+        to.status = from.status < 0 ? from.status : VI_ERROR_ALLOC;
+    }
 }
 } // namespace
 
@@ -135,7 +149,7 @@ bool VisaFunctionCallHandler::distribute(const _visaFunctionCall &call, VisaFunc
             return false;
 
         finsihedFunctionCall &slot = m_finished[m_finishedWrite];
-        slot.call = call;
+        copyResult(call, slot.call);
         slot.listener = listener;
         // Publishing under the lock: either the listener is found to be gone here, or detaching it finds this copy.
         const std::lock_guard guard(m_listenersMutex);

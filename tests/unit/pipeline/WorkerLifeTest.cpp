@@ -4,9 +4,7 @@
 
 #include <QFile>
 
-using testing::Contains;
 using testing::ElementsAre;
-using testing::StartsWith;
 
 namespace
 {
