@@ -4,3 +4,5 @@ tester_library(tester-visa
     visa/VisaSessionWithLog.cpp
   LIBRARIES tester-log tester-base
 )
+# A library that lacks an operation is found out when the program starts, not when the operation is first used.
+target_link_options(tester-visa INTERFACE LINKER:-z,now)

@@ -68,7 +68,8 @@ struct Call {
     std::uint32_t handle = 0;                ///< the first argument
     std::vector<std::uint64_t> numbers = {}; ///< the other input numbers and addresses, in order
     std::vector<std::string> texts = {};     ///< input texts and bytes, in order; viVPrintf: format, then the text made
-    std::vector<std::uint64_t> outputsBefore = {}; ///< what the output numbers (and first bytes) held on entry
+    std::vector<std::uint64_t> outputsBefore =
+        {}; ///< what the output numbers held on entry; the first byte of texts and attributes
 };
 
 /// A resource that searches find, with the text attributes that its find list answers.

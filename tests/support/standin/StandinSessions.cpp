@@ -114,15 +114,15 @@ ViStatus viFindNext(ViFindList findList, ViChar desc[])
 ViStatus viGetAttribute(ViObject vi, ViAttr attrName, void *attrValue)
 {
     const bool isText = (attrName & 0x80000000u) != 0;
-    std::uint64_t before = 0;
-    std::memcpy(&before, attrValue, isText ? 1 : sizeof before);
-    const Answer answer =
-        enter({.operation = "viGetAttribute", .handle = vi, .numbers = {attrName}, .outputsBefore = {before}});
+    const Answer answer = enter({.operation = "viGetAttribute",
+                                 .handle = vi,
+                                 .numbers = {attrName},
+                                 .outputsBefore = {*static_cast<const unsigned char *>(attrValue)}});
     if (!isFriendly(answer)) {
         if (isText && !answer.bytes.empty())
             copyText(static_cast<ViChar *>(attrValue), answer.bytes);
         if (!isText && !answer.numbers.empty())
-            std::memcpy(attrValue, &answer.numbers[0], sizeof answer.numbers[0]);
+            std::memcpy(attrValue, &answer.numbers[0], sizeof answer.numbers[0]); // the caller gave 64 bits
         return *answer.status;
     }
     State &state = State::instance();
