@@ -108,22 +108,26 @@ void LogTextDisplay::setupUi()
     hint->setToolTip(tr("The rows go to the clipboard as text, the columns separated by tabs."));
     hint->setWordWrap(true);
 
-    auto *controls = new QHBoxLayout;
-    controls->addWidget(m_clear);
-    controls->addWidget(m_liveMode);
-    controls->addWidget(m_viewMode);
-    controls->addSpacing(8);
-    controls->addWidget(linesCaption);
-    controls->addWidget(m_lines);
-    controls->addSpacing(8);
-    controls->addWidget(displayedCaption);
-    controls->addWidget(m_displayed);
-    controls->addStretch();
+    auto *buttons = new QHBoxLayout;
+    buttons->addWidget(m_clear);
+    buttons->addWidget(m_liveMode);
+    buttons->addWidget(m_viewMode);
+    buttons->addStretch();
+
+    constexpr int Gap = 12;
+    auto *numbers = new QHBoxLayout;
+    numbers->addWidget(linesCaption);
+    numbers->addWidget(m_lines);
+    numbers->addSpacing(Gap);
+    numbers->addWidget(displayedCaption);
+    numbers->addWidget(m_displayed);
+    numbers->addStretch();
 
     auto *layout = new QVBoxLayout(this);
     layout->setContentsMargins(0, 0, 0, 0);
     layout->addWidget(m_table, 1);
-    layout->addLayout(controls);
+    layout->addLayout(buttons);
+    layout->addLayout(numbers);
     layout->addWidget(hint);
 }
 
@@ -134,6 +138,15 @@ void LogTextDisplay::setupTable()
     m_table->setAccessibleName(tr("Log"));
     m_table->setToolTip(tr("The VISA calls of this session, the newest at the bottom"));
     m_table->setHorizontalHeaderLabels({tr("Line"), tr("Duration"), tr("Status"), tr("Visa Operation")});
+    const QString widthTip = tr("Drag the right border to see more, double-click it to see everything.");
+    m_table->horizontalHeaderItem(LineColumn)
+        ->setToolTip(tr("Number of the line: one sequence for all sessions, the log file's too. ") + widthTip);
+    m_table->horizontalHeaderItem(DurationColumn)
+        ->setToolTip(tr("Time that the VISA library took for the call, in whole units. ") + widthTip);
+    m_table->horizontalHeaderItem(StatusColumn)
+        ->setToolTip(tr("What the call returned: errors are red, warnings and completion codes orange. ") + widthTip);
+    m_table->horizontalHeaderItem(OperationColumn)
+        ->setToolTip(tr("The VISA function with its arguments, or a message of a test or an event"));
     m_table->setHorizontalScrollBarPolicy(Qt::ScrollBarAlwaysOff);
     m_table->setEditTriggers(QAbstractItemView::NoEditTriggers);
     m_table->setSelectionBehavior(QAbstractItemView::SelectRows);
