@@ -335,7 +335,7 @@ void LogTextDisplay::keyPressEvent(QKeyEvent *event)
 
 bool LogTextDisplay::eventFilter(QObject *watched, QEvent *event)
 {
-    // The table has the focus when rows are selected, and would copy one cell by itself.
+    // The table has the focus when rows are selected, and would copy a single cell first.
     if (watched == m_table && event->type() == QEvent::KeyPress) {
         auto *key = static_cast<QKeyEvent *>(event);
         if (isCopy(key)) {
