@@ -1,6 +1,6 @@
 // A source file to add to a test program that needs a QApplication: it creates one before the first test and destroys it
 // after the last one. The offscreen platform is taken unless the environment asks for another one, and home is a temporary
-// folder: no test touches the user's settings, data or documents.
+// folder: no test touches the user's settings, data or documents. A process that a test starts shares that home.
 #include <QApplication>
 #include <QDir>
 #include <QFile>
@@ -17,14 +17,8 @@ class QtEnvironment : public testing::Environment
 public:
     void SetUp() override
     {
-        ASSERT_TRUE(m_home.isValid());
-        qputenv("HOME", QFile::encodeName(m_home.path()));
-        for (const char *variable : {"XDG_CONFIG_HOME", "XDG_DATA_HOME", "XDG_CACHE_HOME", "XDG_RUNTIME_DIR"}) {
-            const QString folder = m_home.filePath(QString::fromLatin1(variable).toLower());
-            QDir().mkpath(folder);
-            QFile::setPermissions(folder, QFile::ReadOwner | QFile::WriteOwner | QFile::ExeOwner);
-            qputenv(variable, QFile::encodeName(folder));
-        }
+        if (!qEnvironmentVariableIsSet("KYVISA_TEST_HOME"))
+            makeHome();
         if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM"))
             qputenv("QT_QPA_PLATFORM", "offscreen");
         m_application = std::make_unique<QApplication>(m_count, m_arguments);
@@ -33,7 +27,21 @@ public:
     void TearDown() override { m_application.reset(); }
 
 private:
-    QTemporaryDir m_home;
+    void makeHome()
+    {
+        m_home = std::make_unique<QTemporaryDir>();
+        ASSERT_TRUE(m_home->isValid());
+        qputenv("KYVISA_TEST_HOME", QFile::encodeName(m_home->path()));
+        qputenv("HOME", QFile::encodeName(m_home->path()));
+        for (const char *variable : {"XDG_CONFIG_HOME", "XDG_DATA_HOME", "XDG_CACHE_HOME", "XDG_RUNTIME_DIR"}) {
+            const QString folder = m_home->filePath(QString::fromLatin1(variable).toLower());
+            QDir().mkpath(folder);
+            QFile::setPermissions(folder, QFile::ReadOwner | QFile::WriteOwner | QFile::ExeOwner);
+            qputenv(variable, QFile::encodeName(folder));
+        }
+    }
+
+    std::unique_ptr<QTemporaryDir> m_home;
     char m_name[5] = "test";
     char *m_arguments[2] = {m_name, nullptr};
     int m_count = 1;

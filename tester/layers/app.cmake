@@ -1,0 +1,7 @@
+tester_library(tester-app
+  SOURCES
+    app/File.cpp
+    app/MainWindow.cpp
+    app/SessionInstanceTab.cpp
+  LIBRARIES tester-panels tester-logview tester-worker tester-log tester-base Qt5::Widgets
+)
