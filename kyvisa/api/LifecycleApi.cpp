@@ -38,14 +38,8 @@ ViStatus viClose(ViObject vi)
     if (vi == VI_NULL)
         return VI_WARN_NULL_OBJECT;
     return guarded([&]() -> ViStatus {
-        const ObjectPointer object = Library::instance().handles.remove(vi);
-        if (!object)
-            return VI_ERROR_INV_OBJECT;
-        if (object->inherited() && object->asInstrument()) {
-            object->abandon();
-            return VI_SUCCESS;
-        }
-        return object->close();
+        ObjectPointer object = Library::instance().handles.remove(vi);
+        return object ? Object::dispose(std::move(object)) : VI_ERROR_INV_OBJECT;
     });
 }
 

@@ -12,6 +12,9 @@ namespace kyvisa
 class ResourceManager;
 class InstrumentSession;
 class FindList;
+class Object;
+
+using ObjectPointer = std::shared_ptr<Object>;
 
 /**
  * What a handle stands for. The handle table holds one reference, each call that works on the object another: an object
@@ -34,6 +37,9 @@ public:
     /// here, and its locks may be held for ever.
     virtual void abandon() {}
 
+    /// Closes an object that was taken out of the table, in whichever way its process allows.
+    static ViStatus dispose(ObjectPointer object);
+
     virtual ResourceManager *asResourceManager() { return nullptr; }
     virtual InstrumentSession *asInstrument() { return nullptr; }
     virtual FindList *asFindList() { return nullptr; }
@@ -41,7 +47,5 @@ public:
 private:
     const std::uint32_t m_epoch = os::forkEpoch();
 };
-
-using ObjectPointer = std::shared_ptr<Object>;
 
 } // namespace kyvisa

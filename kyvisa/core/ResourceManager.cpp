@@ -55,8 +55,8 @@ ViStatus ResourceManager::open(const ViChar *text, ViAccessMode accessMode, ViUI
     }
     if (status < VI_SUCCESS) {
         // Whoever takes it out of the table closes it; the resource manager may have been closed meanwhile.
-        if (const ObjectPointer own = m_library.handles.remove(handle))
-            own->close();
+        if (ObjectPointer own = m_library.handles.remove(handle))
+            dispose(std::move(own));
         return status;
     }
     session = handle;
@@ -111,12 +111,8 @@ ViStatus ResourceManager::setAttribute(ViAttr attribute, ViAttrState state)
 
 ViStatus ResourceManager::close()
 {
-    for (const ObjectPointer &child : m_library.handles.removeChildren(m_handle)) {
-        if (child->inherited())
-            child->abandon();
-        else
-            child->close();
-    }
+    for (ObjectPointer &child : m_library.handles.removeChildren(m_handle))
+        dispose(std::move(child));
     return VI_SUCCESS;
 }
 

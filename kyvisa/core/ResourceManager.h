@@ -31,6 +31,7 @@ public:
     ViStatus getAttribute(ViAttr attribute, void *value) override;
     ViStatus setAttribute(ViAttr attribute, ViAttrState value) override;
     ViStatus close() override;
+    void abandon() override { close(); }
     ResourceManager *asResourceManager() override { return this; }
 
 private:

@@ -1,8 +1,11 @@
 #include "kyvisa/transport/TransportFactory.h"
 
-#include "kyvisa/core/AttributeTable.h"
+#include "kyvisa/core/AttributeStore.h"
 #include "kyvisa/include/visa.h"
-#include "kyvisa/transport/Transport.h"
+#include "kyvisa/os/Connector.h"
+#include "kyvisa/transport/HislipTransport.h"
+#include "kyvisa/transport/IoStatus.h"
+#include "kyvisa/transport/SocketTransport.h"
 #include "wire/Hislip.h"
 
 namespace kyvisa
@@ -37,9 +40,18 @@ std::uint16_t sessionKind(const ResourceName &name, ViStatus &status)
     return 0;
 }
 
-ViStatus openTransport(const ResourceName &, const os::WaitLimit &, AttributeStore &, std::unique_ptr<Transport> &)
+ViStatus openTransport(const ResourceName &name, const os::WaitLimit &limit, AttributeStore &attributes,
+                       std::unique_ptr<Transport> &transport)
 {
-    return VI_ERROR_LIBRARY_NFOUND;
+    if (name.isHislip())
+        return HislipTransport::connect(name, limit, attributes, transport);
+    os::StreamSocket socket;
+    const os::IoResult connected = os::connectStream(name.host, name.port, limit, socket);
+    if (connected != os::IoResult::Done)
+        return connectStatus(connected, limit);
+    attributes.setText(VI_ATTR_TCPIP_ADDR, socket.peerAddress());
+    transport = std::make_unique<SocketTransport>(std::move(socket));
+    return VI_SUCCESS;
 }
 
 } // namespace kyvisa
