@@ -4,6 +4,7 @@
 #include <QApplication>
 #include <QDir>
 #include <QFile>
+#include <QScreen>
 #include <QTemporaryDir>
 
 #include <gtest/gtest.h>
@@ -12,6 +13,9 @@
 
 namespace
 {
+// The offscreen platform never deletes its screen. While somebody knows where it is, the leak checker does not mind.
+const void *volatile s_platformScreen = nullptr;
+
 class QtEnvironment : public testing::Environment
 {
 public:
@@ -22,6 +26,7 @@ public:
         if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM"))
             qputenv("QT_QPA_PLATFORM", "offscreen");
         m_application = std::make_unique<QApplication>(m_count, m_arguments);
+        s_platformScreen = QGuiApplication::primaryScreen()->handle();
     }
 
     void TearDown() override { m_application.reset(); }
