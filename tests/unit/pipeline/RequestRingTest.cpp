@@ -1,8 +1,11 @@
 #include "pipeline/VisaFunctionCallHandler.h"
 
+#include "Asleep.h"
 #include "RecordingListener.h"
 
 #include <gmock/gmock.h>
+
+#include <unistd.h>
 
 #include <future>
 #include <memory>
@@ -156,13 +159,15 @@ TEST_F(RequestRing, ATakerWaitsForARequest)
 TEST_F(RequestRing, ClosingWakesATakerAndEndsTaking)
 {
     std::promise<bool> answer;
-    std::promise<void> started;
+    std::promise<pid_t> started;
     std::thread worker([&] {
         _visaFunctionCall call;
-        started.set_value();
+        started.set_value(gettid());
         answer.set_value(m_handler->getVisaFunctionCall(call));
     });
-    started.get_future().wait();
+    const pid_t taker = started.get_future().get();
+    while (!isAsleep(taker))
+        std::this_thread::yield();
     m_handler->close();
     EXPECT_FALSE(answer.get_future().get());
     worker.join();

@@ -1,5 +1,6 @@
 #include "pipeline/VisaFunctionCallHandler.h"
 
+#include "Asleep.h"
 #include "RecordingListener.h"
 
 #include <gmock/gmock.h>
@@ -11,10 +12,8 @@
 
 #include <atomic>
 #include <chrono>
-#include <fstream>
 #include <memory>
 #include <new>
-#include <string>
 #include <thread>
 
 using testing::ElementsAre;
@@ -148,13 +147,18 @@ TEST_F(ResultRing, ListenersComeAndGoWhileAProducerWaitsForRoom)
         finish(VisaFunctionCallTyp::Read, i);
     ASSERT_EQ(m_handler->finishedCount(), 4096u);
     std::thread worker([&] { finish(VisaFunctionCallTyp::Read, 2048); });
+    finsihedFunctionCall first;
+    ASSERT_TRUE(m_handler->getFinishedVisaFunctionCall(first));
+    while (m_handler->finishedCount() < 4096)
+        std::this_thread::yield();
 
-    // Neither waits for the worker, which waits for room.
+    // The worker has served one of its two listeners and waits for room for the other one's copy. Neither of these waits
+    // for the worker.
     const _VisaFunctionCallHandlerListener *gone = goes.get();
     goes.reset();
     RecordingListener comes(m_handler.get(), VisaFunctionCallTyp::Read);
 
-    unsigned forStaying = 0;
+    unsigned forStaying = 1;
     unsigned blank = 0;
     for (finsihedFunctionCall record; forStaying < 2049;) {
         if (!m_handler->getFinishedVisaFunctionCall(record)) {
@@ -166,6 +170,7 @@ TEST_F(ResultRing, ListenersComeAndGoWhileAProducerWaitsForRoom)
         blank += record.listener == nullptr;
     }
     worker.join();
+    EXPECT_THAT(takeListeners(), IsEmpty()) << "a copy for the one that went";
     EXPECT_EQ(blank, 2048u);
 }
 
@@ -241,15 +246,6 @@ TEST_F(ResultRing, TheThreadsOfWorkerAndTestsShareItInFullRecords)
     EXPECT_EQ(nextAll[1], Count);
 }
 
-/// True once the process sleeps, as one does that waits for a lock.
-bool sleeps(pid_t process)
-{
-    std::ifstream file("/proc/" + std::to_string(process) + "/stat");
-    std::string text((std::istreambuf_iterator<char>(file)), {});
-    const auto name = text.rfind(')');
-    return name != std::string::npos && text.compare(name, 3, ") S") == 0;
-}
-
 TEST_F(ResultRing, ItsMutexServesTwoProcesses)
 {
     void *memory =
@@ -276,7 +272,7 @@ TEST_F(ResultRing, ItsMutexServesTwoProcesses)
             _exit(0);
         }
         ASSERT_GT(child, 0);
-        while (!sleeps(child))
+        while (!isAsleep(child)) // waits for the mutex
             std::this_thread::yield();
 
         finsihedFunctionCall record;

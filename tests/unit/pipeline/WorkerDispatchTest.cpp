@@ -7,6 +7,8 @@
 
 #include <malloc.h>
 
+#include <cstring>
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 
@@ -233,6 +235,21 @@ TEST(ReceivedText, TakesNothingWithAnyOtherStatus)
         EXPECT_THROW(receiveText(5, text, read), VisaError);
         EXPECT_EQ(text, "");
     }
+}
+
+TEST(ReceivedText, EndsAtTheCountReceived)
+{
+    std::string text;
+    receiveText(100, text, [](char *buffer, ViUInt32 size) -> ViUInt32 {
+        std::memset(buffer, 'x', size);
+        return 3;
+    });
+    EXPECT_EQ(text, "xxx");
+    receiveText(100, text, [](char *buffer, ViUInt32 size) -> ViUInt32 {
+        std::memset(buffer, 'y', size);
+        return 101;
+    });
+    EXPECT_EQ(text, std::string(100, 'y'));
 }
 
 TEST(ReceivedText, TouchesNoMemoryThatTheReadLeavesAlone)
