@@ -206,16 +206,20 @@ void VisaFunctionCallHandler::addVisaFunctionCallHandlerListener(_VisaFunctionCa
 
 bool VisaFunctionCallHandler::removeVisaFunctionCallHandlerListener(_VisaFunctionCallHandlerListener *listener)
 {
-    m_handlerListeners.remove(listener);
+    forgetListener(listener);
     if (listener)
         listener->removeHandler();
+    return true;
+}
 
+void VisaFunctionCallHandler::forgetListener(_VisaFunctionCallHandlerListener *listener)
+{
+    m_handlerListeners.remove(listener);
     // The listener may be gone a moment from now: nothing may reach it any more, however it was registered.
     const std::lock_guard guard(m_listenersMutex);
     for (auto &listeners : m_listeners)
         listeners.remove(listener);
     blankWaitingResults(listener);
-    return true;
 }
 
 void VisaFunctionCallHandler::blankWaitingResults(const _VisaFunctionCallHandlerListener *listener)

@@ -56,7 +56,10 @@ public:
     void VisaFunctionCallStart(const VisaFunctionCallTyp &type);
 
     void addVisaFunctionCallHandlerListener(_VisaFunctionCallHandlerListener *listener);
+    /// Detaches @p listener and tells it so by removeHandler(), also when it was not attached.
     bool removeVisaFunctionCallHandlerListener(_VisaFunctionCallHandlerListener *listener);
+    /// Drops every trace of @p listener without telling it.
+    void forgetListener(_VisaFunctionCallHandlerListener *listener);
     /// False when @p type is above 41 or the listener is registered for it already.
     bool addVisaFunctionCallListener(_VisaFunctionCallHandlerListener *listener, VisaFunctionCallTyp type);
     bool removeVisaFunctionCallListener(_VisaFunctionCallHandlerListener *listener, VisaFunctionCallTyp type);

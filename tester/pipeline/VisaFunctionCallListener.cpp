@@ -2,6 +2,8 @@
 
 #include "pipeline/VisaFunctionCallHandler.h"
 
+#include <utility>
+
 _VisaFunctionCallHandlerListener::_VisaFunctionCallHandlerListener(VisaFunctionCallHandler *handler)
     : m_handler(handler)
 {
@@ -26,7 +28,9 @@ void _VisaFunctionCallHandlerListener::setVisaFunctionCallHandler(VisaFunctionCa
 
 void _VisaFunctionCallHandlerListener::removeHandler()
 {
-    m_handler = nullptr;
+    // Whoever calls this: the handler must not keep a pointer that nobody will take back.
+    if (VisaFunctionCallHandler *handler = std::exchange(m_handler, nullptr))
+        handler->forgetListener(this);
 }
 
 VisaFunctionCallListener::VisaFunctionCallListener(VisaFunctionCallHandler *handler, VisaFunctionCallTyp type)

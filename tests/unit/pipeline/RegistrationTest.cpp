@@ -107,6 +107,22 @@ TEST_F(Registration, DetachingTellsAListenerEvenWhenItWasNotAttached)
     RecordingListener listener(other.get(), VisaFunctionCallTyp::Open);
     EXPECT_TRUE(m_handler->removeVisaFunctionCallHandlerListener(&listener));
     EXPECT_EQ(listener.handler(), nullptr);
+    EXPECT_EQ(copies(*other, VisaFunctionCallTyp::Open), 0u) << "the handler it was attached to still reaches it";
+}
+
+TEST_F(Registration, AListenerThatForgetsItsHandlerIsForgottenThere)
+{
+    {
+        RecordingListener listener(m_handler.get(), VisaFunctionCallTyp::Open);
+        _visaFunctionCall call = makeCall(VisaFunctionCallTyp::Open);
+        m_handler->VisaFunctionCallFinshed(call);
+        listener.removeHandler();
+    }
+    finsihedFunctionCall record;
+    ASSERT_TRUE(m_handler->getFinishedVisaFunctionCall(record));
+    EXPECT_EQ(record.listener, nullptr);
+    EXPECT_EQ(copies(VisaFunctionCallTyp::Open), 0u);
+    m_handler.reset(); // would reach into the listener that is gone
 }
 
 TEST_F(Registration, ADetachedListenerIsNotToldTwice)
