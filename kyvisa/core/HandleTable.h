@@ -36,7 +36,9 @@ public:
 
     // Around fork(): the table is consistent in the child because the forking thread holds it.
     void lockForFork() { m_mutex.lock(); }
-    void unlockAfterFork() { m_mutex.unlock(); }
+    void unlockInParent() { m_mutex.unlock(); }
+    /// A lock for many readers knows its owner by the thread's number, and that is another one in the child.
+    void unlockInChild() { std::construct_at(&m_mutex); }
 
 private:
     static constexpr std::size_t MaxSlots = 0x10000;

@@ -17,13 +17,14 @@ void beforeFork()
 void afterForkInParent()
 {
     Library::instance().locks.unlockAfterFork();
-    Library::instance().handles.unlockAfterFork();
+    Library::instance().handles.unlockInParent();
 }
 
 void afterForkInChild()
 {
     Library::instance().locks.forgetAll();
-    afterForkInParent();
+    Library::instance().locks.unlockAfterFork();
+    Library::instance().handles.unlockInChild();
 }
 
 } // namespace

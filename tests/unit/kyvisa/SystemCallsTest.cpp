@@ -1,0 +1,311 @@
+// The bottom layer when the system says no: each call fails once, nothing leaks, nothing hangs.
+#include "kyvisa/os/SystemCalls.h"
+#include "kyvisa/os/Connector.h"
+#include "kyvisa/os/Resolver.h"
+#include "support/ScriptedPeer.h"
+#include "support/Stopwatch.h"
+
+#include <array>
+#include <atomic>
+#include <cerrno>
+#include <filesystem>
+#include <gtest/gtest.h>
+#include <netinet/in.h>
+#include <thread>
+
+using namespace kyvisa::os;
+using test::ScriptedPeer;
+using test::Stopwatch;
+
+namespace
+{
+
+WaitLimit within(int milliseconds, const Wakeup &wakeup)
+{
+    return {Deadline::after(std::chrono::milliseconds(milliseconds)), wakeup};
+}
+
+std::size_t openDescriptors()
+{
+    const std::filesystem::directory_iterator entries("/proc/self/fd");
+    return static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
+}
+
+void failWith(int error)
+{
+    errno = error;
+}
+
+TEST(Deadline, ComesFromTheTimeOutsOfTheInterface)
+{
+    EXPECT_TRUE(Deadline::afterVisaTimeout(0).expired());
+    EXPECT_TRUE(Deadline::afterVisaTimeout(0xFFFFFFFF).isNever());
+    EXPECT_FALSE(Deadline::afterVisaTimeout(0xFFFFFFFF).expired());
+    const Deadline longest = Deadline::afterVisaTimeout(0xFFFFFFFE);
+    EXPECT_FALSE(longest.expired());
+    EXPECT_FALSE(longest.isNever());
+    EXPECT_EQ(Deadline::now().remaining().count(), 0);
+    EXPECT_EQ(longest.orEarlier(Deadline::never()).end(), longest.end());
+}
+
+TEST(Connector, RefusedAddressGoesOnWithTheNext)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); }); // IPv4 alone; ::1 is tried first
+    const Wakeup nobody;
+    StreamSocket socket;
+    EXPECT_EQ(connectStream("localhost", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    EXPECT_EQ(socket.peerAddress(), "127.0.0.1");
+}
+
+TEST(Connector, SilentAddressDoesNotEatTheTimeOfTheNext)
+{
+    static std::atomic<int> attempts;
+    attempts = 0;
+    SystemCalls calls = realSystemCalls();
+    // The first address never answers: its connection stays in progress for ever.
+    calls.connect = [](int descriptor, const sockaddr *address, socklen_t length) {
+        if (attempts++ > 0)
+            return ::connect(descriptor, address, length);
+        failWith(EINPROGRESS);
+        return -1;
+    };
+    calls.getsockopt = [](int descriptor, int level, int option, void *value, socklen_t *length) {
+        return ::getsockopt(descriptor, level, option, value, length);
+    };
+    calls.poll = [](pollfd *watched, nfds_t count, const timespec *timeout) {
+        // A socket that never began to connect reports a hang-up at once; the network would stay silent.
+        std::array<pollfd, 8> copy{};
+        std::copy(watched, watched + count, copy.begin());
+        if (count >= 2)
+            copy[0].fd = -1;
+        const int ready = ::ppoll(copy.data(), count, timeout, nullptr);
+        for (nfds_t i = 0; i < count; ++i)
+            watched[i].revents = copy[i].revents;
+        return ready;
+    };
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
+    const Wakeup nobody;
+    StreamSocket socket;
+    const Stopwatch watch;
+    {
+        const ReplacedSystemCalls replaced(calls);
+        EXPECT_EQ(connectStream("localhost", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    }
+    EXPECT_LT(watch.milliseconds(), 10000);
+}
+
+TEST(Connector, WakeUpEndsAConnectionAttempt)
+{
+    SystemCalls calls = realSystemCalls();
+    calls.connect = [](int, const sockaddr *, socklen_t) {
+        failWith(EINPROGRESS);
+        return -1;
+    };
+    calls.poll = [](pollfd *watched, nfds_t count, const timespec *timeout) {
+        const int ready = ::ppoll(watched + count - 1, 1, timeout, nullptr); // the wake-up alone
+        for (nfds_t i = 0; i + 1 < count; ++i)
+            watched[i].revents = 0;
+        return ready;
+    };
+    const ReplacedSystemCalls replaced(calls);
+    Wakeup wakeup;
+    std::thread other([&] { wakeup.close(); });
+    StreamSocket socket;
+    EXPECT_EQ(connectStream("127.0.0.1", 9, {Deadline::never(), wakeup}, socket), IoResult::Woken);
+    other.join();
+}
+
+TEST(Connector, FailingCallsLeakNothing)
+{
+    const Wakeup nobody;
+    StreamSocket socket;
+    const std::size_t before = openDescriptors();
+    {
+        SystemCalls calls = realSystemCalls();
+        calls.socket = [](int, int, int) {
+            failWith(EMFILE);
+            return -1;
+        };
+        const ReplacedSystemCalls replaced(calls);
+        EXPECT_EQ(connectStream("127.0.0.1", 9, within(20000, nobody), socket), IoResult::NoMemory);
+    }
+    {
+        SystemCalls calls = realSystemCalls();
+        calls.connect = [](int, const sockaddr *, socklen_t) {
+            failWith(ENETUNREACH);
+            return -1;
+        };
+        const ReplacedSystemCalls replaced(calls);
+        EXPECT_EQ(connectStream("localhost", 9, within(20000, nobody), socket), IoResult::NoAddress);
+    }
+    {
+        SystemCalls calls = realSystemCalls();
+        calls.connect = [](int, const sockaddr *, socklen_t) {
+            failWith(EINPROGRESS);
+            return -1;
+        };
+        calls.poll = [](pollfd *, nfds_t, const timespec *) {
+            failWith(ENOMEM);
+            return -1;
+        };
+        const ReplacedSystemCalls replaced(calls);
+        EXPECT_EQ(connectStream("127.0.0.1", 9, within(20000, nobody), socket), IoResult::NoMemory);
+    }
+    EXPECT_EQ(openDescriptors(), before);
+}
+
+TEST(Wakeup, WithoutADescriptorSaysSo)
+{
+    SystemCalls calls = realSystemCalls();
+    calls.eventfd = [](unsigned, int) {
+        failWith(EMFILE);
+        return -1;
+    };
+    const ReplacedSystemCalls replaced(calls);
+    const Wakeup wakeup;
+    EXPECT_FALSE(wakeup.valid());
+}
+
+TEST(Wakeup, TerminationIsForgottenAndClosingIsNot)
+{
+    Wakeup wakeup;
+    wakeup.terminate();
+    EXPECT_TRUE(wakeup.raised());
+    wakeup.rearm();
+    EXPECT_FALSE(wakeup.raised());
+    wakeup.close();
+    wakeup.rearm();
+    EXPECT_TRUE(wakeup.raised());
+}
+
+TEST(Resolver, AnswersNumbersAndLocalhostWithoutAsking)
+{
+    SystemCalls calls = realSystemCalls();
+    calls.getaddrinfo = [](const char *node, const char *service, const addrinfo *hints, addrinfo **result) {
+        EXPECT_NE(hints->ai_flags & AI_NUMERICHOST, 0);
+        return ::getaddrinfo(node, service, hints, result);
+    };
+    const ReplacedSystemCalls replaced(calls);
+    const Wakeup nobody;
+    std::vector<Address> addresses;
+    EXPECT_EQ(resolve("127.0.0.1", 1, within(20000, nobody), addresses), IoResult::Done);
+    EXPECT_EQ(addresses.size(), 1u);
+    EXPECT_EQ(resolve("::1", 1, within(20000, nobody), addresses), IoResult::Done);
+    EXPECT_EQ(addresses.size(), 1u);
+    EXPECT_EQ(resolve("LOCALHOST", 1, within(20000, nobody), addresses), IoResult::Done);
+    EXPECT_EQ(addresses.size(), 2u);
+}
+
+std::atomic<bool> g_nameServerAnswers;
+std::atomic<int> g_questionsOpen;
+
+TEST(Resolver, NameServerThatDoesNotAnswerEndsWithTheDeadlineOrTheWakeUp)
+{
+    g_nameServerAnswers = false;
+    g_questionsOpen = 0;
+    static SystemCalls calls = realSystemCalls();
+    calls.getaddrinfo = [](const char *node, const char *service, const addrinfo *hints, addrinfo **result) {
+        if ((hints->ai_flags & AI_NUMERICHOST) != 0)
+            return ::getaddrinfo(node, service, hints, result);
+        ++g_questionsOpen;
+        while (!g_nameServerAnswers)
+            std::this_thread::yield();
+        addrinfo numeric = *hints;
+        numeric.ai_flags |= AI_NUMERICHOST;
+        const int status = ::getaddrinfo("127.0.0.9", service, &numeric, result);
+        --g_questionsOpen;
+        return status;
+    };
+    const ReplacedSystemCalls replaced(calls);
+    std::vector<Address> addresses;
+    const Wakeup nobody;
+    EXPECT_EQ(resolve("box.example", 1, within(50, nobody), addresses), IoResult::TimedOut);
+    Wakeup wakeup;
+    std::thread other([&] { wakeup.terminate(); });
+    EXPECT_EQ(resolve("box.example", 1, {Deadline::never(), wakeup}, addresses), IoResult::Woken);
+    other.join();
+    g_nameServerAnswers = true;
+    EXPECT_EQ(resolve("box.example", 1, within(20000, nobody), addresses), IoResult::Done);
+    ASSERT_EQ(addresses.size(), 1u);
+    EXPECT_EQ(addresses[0].storage.ss_family, AF_INET);
+    while (g_questionsOpen > 0)
+        std::this_thread::yield();
+}
+
+TEST(Resolver, UnknownNameIsNoAddress)
+{
+    static SystemCalls calls = realSystemCalls();
+    calls.getaddrinfo = [](const char *, const char *, const addrinfo *, addrinfo **) { return EAI_NONAME; };
+    const ReplacedSystemCalls replaced(calls);
+    std::vector<Address> addresses;
+    const Wakeup nobody;
+    EXPECT_EQ(resolve("nowhere.example", 1, within(20000, nobody), addresses), IoResult::NoAddress);
+}
+
+TEST(StreamSocket, SurvivesInterruptedAndShortCalls)
+{
+    static std::atomic<int> calls;
+    calls = 0;
+    SystemCalls seam = realSystemCalls();
+    seam.sendmsg = [](int descriptor, const msghdr *message, int flags) -> ssize_t {
+        EXPECT_NE(flags & MSG_NOSIGNAL, 0);
+        if (calls++ % 3 == 0) {
+            failWith(EINTR);
+            return -1;
+        }
+        return ::send(descriptor, message->msg_iov[0].iov_base, 1, flags); // one byte at a time
+    };
+    seam.recv = [](int descriptor, void *buffer, size_t, int flags) -> ssize_t {
+        if (calls++ % 2 == 0) {
+            failWith(EINTR);
+            return -1;
+        }
+        return ::recv(descriptor, buffer, 1, flags);
+    };
+    seam.poll = [](pollfd *watched, nfds_t count, const timespec *timeout) {
+        if (calls++ % 2 == 0) {
+            failWith(EINTR);
+            return -1;
+        }
+        return ::ppoll(watched, count, timeout, nullptr);
+    };
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        test::PeerConnection client = self.accept();
+        client.expect("header and payload");
+        client.send("ok");
+        client.expectClosed();
+    });
+    const Wakeup nobody;
+    const ReplacedSystemCalls replaced(seam);
+    StreamSocket socket;
+    ASSERT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    std::string header = "header ";
+    std::string payload = "and payload";
+    std::array pieces = {iovec{header.data(), header.size()}, iovec{payload.data(), payload.size()}};
+    const Transfer sent = socket.send(pieces, within(20000, nobody));
+    EXPECT_EQ(sent.result, IoResult::Done);
+    EXPECT_EQ(sent.count, 18u);
+    std::array<std::byte, 10> buffer;
+    const Transfer got = socket.receive(buffer, within(20000, nobody));
+    EXPECT_EQ(got.result, IoResult::Done);
+    EXPECT_EQ(got.count, 1u);
+}
+
+TEST(StreamSocket, ResetIsAClosedConnection)
+{
+    std::atomic<bool> connected{false};
+    ScriptedPeer peer([&](ScriptedPeer &self) {
+        test::PeerConnection client = self.accept();
+        while (!connected)
+            std::this_thread::yield();
+        client.reset();
+    });
+    const Wakeup nobody;
+    StreamSocket socket;
+    ASSERT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    connected = true;
+    std::array<std::byte, 10> buffer;
+    EXPECT_EQ(socket.receive(buffer, within(20000, nobody)).result, IoResult::Closed);
+}
+
+} // namespace
