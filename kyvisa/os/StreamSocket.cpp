@@ -104,25 +104,16 @@ Transfer StreamSocket::receiveNow(std::span<std::byte> buffer)
     }
 }
 
-Transfer StreamSocket::receiveMore(std::span<std::byte> buffer, const WaitLimit &limit)
-{
-    const Transfer immediate = receiveNow(buffer);
-    if (immediate.result != IoResult::Done || immediate.count > 0)
-        return immediate;
-    return receive(buffer, limit);
-}
-
 Transfer StreamSocket::receive(std::span<std::byte> buffer, const WaitLimit &limit)
 {
-    if (!isOpen())
-        return {IoResult::Closed, 0};
+    // Trying first costs next to nothing while the answer is on its way, and saves the wait when it is here.
     for (;;) {
-        const IoResult waited = waitFor(POLLIN, limit);
-        if (waited != IoResult::Done)
-            return {waited, 0};
         const Transfer got = receiveNow(buffer);
         if (got.result != IoResult::Done || got.count > 0)
             return got;
+        const IoResult waited = waitFor(POLLIN, limit);
+        if (waited != IoResult::Done)
+            return {waited, 0};
     }
 }
 

@@ -38,10 +38,8 @@ public:
     /// Sends all bytes of all pieces, in one system call where the system takes them. @p pieces is used up on the way.
     Transfer send(std::span<iovec> pieces, const WaitLimit &limit);
 
-    /// Waits for input, then takes what is there, at most the buffer's size; count > 0 when Done.
+    /// Takes what is there, at most the buffer's size, and waits when nothing is; count > 0 when Done.
     Transfer receive(std::span<std::byte> buffer, const WaitLimit &limit);
-    /// As receive(), but tries first: for the middle of a transfer, where input is expected to be there.
-    Transfer receiveMore(std::span<std::byte> buffer, const WaitLimit &limit);
     /// Takes what is there without waiting; Done with 0 bytes when nothing is.
     Transfer receiveNow(std::span<std::byte> buffer);
 

@@ -55,9 +55,9 @@ os::Transfer HislipChannel::readPayload(std::span<std::byte> to, const os::WaitL
     to = to.first(static_cast<std::size_t>(std::min<std::uint64_t>(to.size(), m_payloadLeft)));
     os::Transfer got;
     if (m_input.empty() && to.size() < m_input.capacity())
-        got = m_input.fill(m_socket, limit, ReceiveBuffer::Expect::Now);
+        got = m_input.fill(m_socket, limit);
     if (got.result == IoResult::Done)
-        got = m_input.empty() ? m_socket.receiveMore(to, limit) : os::Transfer{IoResult::Done, m_input.take(to)};
+        got = m_input.empty() ? m_socket.receive(to, limit) : os::Transfer{IoResult::Done, m_input.take(to)};
     m_payloadLeft -= got.count;
     return got;
 }
@@ -65,7 +65,7 @@ os::Transfer HislipChannel::readPayload(std::span<std::byte> to, const os::WaitL
 IoResult HislipChannel::peekPayload(std::span<const std::byte> &payload, const os::WaitLimit &limit)
 {
     if (m_input.empty()) {
-        const os::Transfer got = m_input.fill(m_socket, limit, ReceiveBuffer::Expect::Now);
+        const os::Transfer got = m_input.fill(m_socket, limit);
         if (got.result != IoResult::Done)
             return got.result;
     }

@@ -37,9 +37,9 @@ std::span<std::byte> ReceiveBuffer::room()
     return {m_bytes.get() + m_end, m_capacity - m_end};
 }
 
-os::Transfer ReceiveBuffer::fill(os::StreamSocket &socket, const os::WaitLimit &limit, Expect expect)
+os::Transfer ReceiveBuffer::fill(os::StreamSocket &socket, const os::WaitLimit &limit)
 {
-    const os::Transfer got = expect == Expect::Now ? socket.receiveMore(room(), limit) : socket.receive(room(), limit);
+    const os::Transfer got = socket.receive(room(), limit);
     m_end += got.count;
     return got;
 }

@@ -24,9 +24,8 @@ public:
     /// Moves at most @p to.size() bytes out; the number moved.
     std::size_t take(std::span<std::byte> to);
 
-    enum class Expect { Later, Now };
-    /// Receives at least one byte. @param expect Now tries to receive before it waits.
-    os::Transfer fill(os::StreamSocket &socket, const os::WaitLimit &limit, Expect expect = Expect::Later);
+    /// Receives at least one byte.
+    os::Transfer fill(os::StreamSocket &socket, const os::WaitLimit &limit);
     /// Receives what is there, without waiting.
     os::Transfer fillNow(os::StreamSocket &socket);
 

@@ -30,8 +30,7 @@ ViStatus SocketTransport::ended(os::IoResult result, const os::WaitLimit &limit)
 ViStatus SocketTransport::read(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
                                std::size_t &count)
 {
-    auto expect = ReceiveBuffer::Expect::Later;
-    for (;;) {
+    for (bool first = true;; first = false) {
         auto wanted = std::min(buffer.size() - count, m_input.data().size());
         bool terminated = false;
         if (mode.termCharEnabled && wanted > 0) {
@@ -48,21 +47,19 @@ ViStatus SocketTransport::read(std::span<std::byte> buffer, const TransferMode &
             return VI_SUCCESS_MAX_CNT;
 
         os::Transfer got;
-        const bool first = expect == ReceiveBuffer::Expect::Later;
         if (!first && limit.deadline.expired()) {
             got.result = os::IoResult::TimedOut;
         } else if (!mode.termCharEnabled && buffer.size() - count >= InputCapacity) {
             const auto rest = buffer.subspan(count);
-            got = first ? m_socket.receive(rest, limit) : m_socket.receiveMore(rest, limit);
+            got = m_socket.receive(rest, limit);
             count += got.count;
         } else {
-            got = m_input.fill(m_socket, limit, expect);
+            got = m_input.fill(m_socket, limit);
         }
         if (got.result != os::IoResult::Done) {
             m_answerMayBeLate = true;
             return ended(got.result, limit);
         }
-        expect = ReceiveBuffer::Expect::Now;
     }
 }
 
