@@ -1,0 +1,44 @@
+#include "simulator/instrument/ErrorQueue.h"
+
+#include <utility>
+
+namespace simulator
+{
+
+void ErrorQueue::push(ScpiError error)
+{
+    if (m_errors.size() < Capacity)
+        m_errors.push_back(std::move(error));
+    else
+        m_errors.back() = {-350, {}};
+}
+
+ScpiError ErrorQueue::pop()
+{
+    if (m_errors.empty())
+        return {0, {}};
+    ScpiError oldest = std::move(m_errors.front());
+    m_errors.pop_front();
+    return oldest;
+}
+
+std::string errorResponse(const ScpiError &error)
+{
+    constexpr std::size_t MaxText = 255;
+    std::string text{errorText(error.number)};
+    if (!error.info.empty())
+        text += ";";
+    for (const char c : error.info) {
+        if (c < ' ' || c > '~')
+            text += '?';
+        else if (c == '"')
+            text += "\"\"";
+        else
+            text += c;
+        if (text.size() >= MaxText - 1)
+            break; // one short of the limit, so that a doubled quote fits
+    }
+    return std::to_string(error.number) + ",\"" + text + "\"";
+}
+
+} // namespace simulator

@@ -1,0 +1,136 @@
+#include "simulator/instrument/LockTable.h"
+
+#include "simulator/instrument/Timers.h"
+
+#include <algorithm>
+#include <utility>
+
+namespace simulator
+{
+
+LockTable::Owner LockTable::join(std::function<void()> changed)
+{
+    m_clients.emplace(++m_lastOwner, Client{std::move(changed)});
+    return m_lastOwner;
+}
+
+void LockTable::leave(Owner owner)
+{
+    if (const auto wait = waitOf(owner); wait != m_waits.end()) {
+        m_timers.cancel(wait->timer);
+        m_waits.erase(wait);
+    }
+    while (release(owner) != Released::Nothing)
+        continue;
+    m_clients.erase(owner);
+}
+
+void LockTable::request(Owner owner, const std::string &key, std::chrono::milliseconds timeout, AnswerAction answer)
+{
+    const Client &client = m_clients.at(owner);
+    const bool held = m_exclusive == owner || (!key.empty() && client.shares);
+    if (held || waitOf(owner) != m_waits.end())
+        return answer(Answer::Error);
+    if (grant(owner, key))
+        return answer(Answer::Granted);
+    if (timeout.count() <= 0)
+        return answer(Answer::Failed);
+    const Timers::Id timer = m_timers.after(timeout, [this, owner] { endWait(owner); });
+    m_waits.push_back({owner, key, timer, std::move(answer)});
+}
+
+void LockTable::endWait(Owner owner)
+{
+    const auto wait = waitOf(owner);
+    if (wait == m_waits.end())
+        return;
+    m_timers.cancel(wait->timer);
+    const AnswerAction answer = std::move(wait->answer);
+    m_waits.erase(wait);
+    answer(Answer::Failed);
+}
+
+LockTable::Released LockTable::release(Owner owner)
+{
+    if (m_exclusive == owner) {
+        m_exclusive = NoOwner;
+        changed();
+        return Released::Exclusive;
+    }
+    Client &client = m_clients.at(owner);
+    if (!client.shares)
+        return Released::Nothing;
+    client.shares = false;
+    --m_sharers;
+    changed();
+    return Released::Shared;
+}
+
+bool LockTable::grant(Owner owner, const std::string &key)
+{
+    if (m_exclusive != NoOwner)
+        return false;
+    Client &client = m_clients.at(owner);
+    if (key.empty()) {
+        if (m_sharers > 0 && !client.shares)
+            return false;
+        m_exclusive = owner;
+        return true;
+    }
+    if (m_sharers > 0 && key != m_key)
+        return false;
+    m_key = key;
+    client.shares = true;
+    ++m_sharers;
+    return true;
+}
+
+void LockTable::changed()
+{
+    if (std::exchange(m_changeIsDue, true))
+        return;
+    m_timers.after({}, [this] { tellChange(); });
+}
+
+void LockTable::tellChange()
+{
+    m_changeIsDue = false;
+    for (auto wait = m_waits.begin(); wait != m_waits.end();) {
+        if (!grant(wait->owner, wait->key)) {
+            ++wait;
+            continue;
+        }
+        m_timers.cancel(wait->timer);
+        const AnswerAction answer = std::move(wait->answer);
+        m_waits.erase(wait);
+        answer(Answer::Granted);
+        wait = m_waits.begin(); // the answer may have changed the list
+    }
+    // A client that is told may leave, or let others leave.
+    for (auto client = m_clients.begin(); client != m_clients.end();) {
+        const Owner owner = client->first;
+        const std::function<void()> tell = client->second.changed;
+        tell();
+        client = m_clients.upper_bound(owner);
+    }
+}
+
+bool LockTable::allows(Owner owner) const
+{
+    if (m_exclusive != NoOwner)
+        return m_exclusive == owner;
+    return m_sharers == 0 || m_clients.at(owner).shares;
+}
+
+std::size_t LockTable::holders() const
+{
+    const bool alone = m_exclusive != NoOwner && !m_clients.at(m_exclusive).shares;
+    return m_sharers + (alone ? 1 : 0);
+}
+
+std::list<LockTable::Wait>::iterator LockTable::waitOf(Owner owner)
+{
+    return std::find_if(m_waits.begin(), m_waits.end(), [=](const Wait &wait) { return wait.owner == owner; });
+}
+
+} // namespace simulator

@@ -1,0 +1,35 @@
+#pragma once
+
+#include "simulator/server/Connection.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <deque>
+
+namespace simulator
+{
+
+class HislipChannel;
+
+/**
+ * A response on its way to a HiSLIP client: cut into Data messages that the client can take, the last one a DataEND. They are made only as fast as
+ * the connection takes them, so a small message size costs time and no memory. Blocks are shared, not copied.
+ */
+class HislipResponse
+{
+public:
+    void begin(ResponseSegments segments, std::uint32_t messageId);
+    bool active() const { return m_left > 0; }
+    void drop();
+    /// Makes and sends messages of at most @p maxPayload bytes. Returns when all is made or when the connection has enough for now.
+    void pump(HislipChannel &channel, std::size_t maxPayload);
+
+private:
+    std::vector<Outgoing> cut(std::size_t size);
+
+    std::deque<Outgoing> m_pieces;
+    std::size_t m_left = 0;
+    std::uint32_t m_messageId = 0;
+};
+
+} // namespace simulator
