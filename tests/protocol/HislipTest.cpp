@@ -414,6 +414,21 @@ TEST(Hislip, KeepsAnswersInOverlappedMode)
     viClose(session.vi);
 }
 
+TEST(Hislip, StaysInTheModeThatTheInstrumentInsistsOn)
+{
+    converse(
+        [](HislipConnections &client) {
+            client.async.expect(hex("48531300 00000000 0000000000000000"));
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+            client.sync.expect(hex("48530801 00000000 0000000000000000")); // asks for overlap
+            client.sync.send(hex("48530900 00000000 0000000000000000"));   // and does not get it
+        },
+        [](VisaSession &session) {
+            EXPECT_EQ(session.set(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, VI_TRUE), VI_ERROR_NSUP_ATTR_STATE);
+            EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN), VI_FALSE);
+        });
+}
+
 TEST(Hislip, AgreesOnANewMessageSize)
 {
     converse(

@@ -1,0 +1,84 @@
+#include "support/SimulatorProcess.h"
+
+#include <array>
+#include <csignal>
+#include <fcntl.h>
+#include <poll.h>
+#include <spawn.h>
+#include <sstream>
+#include <stdexcept>
+#include <sys/wait.h>
+#include <unistd.h>
+
+extern char **environ;
+
+namespace test
+{
+namespace
+{
+
+constexpr int Patience = 30000; // milliseconds: only a simulator that does not start takes that long
+
+} // namespace
+
+SimulatorProcess::SimulatorProcess(const std::vector<std::string> &options)
+{
+    std::vector<std::string> words = {SIMULATOR_FILE};
+    words.insert(words.end(), options.begin(), options.end());
+    std::vector<char *> arguments;
+    for (std::string &word : words)
+        arguments.push_back(word.data());
+    arguments.push_back(nullptr);
+
+    std::array<int, 2> output{};
+    if (::pipe2(output.data(), O_CLOEXEC) != 0)
+        throw std::runtime_error("no pipe for the simulator");
+    posix_spawn_file_actions_t actions;
+    ::posix_spawn_file_actions_init(&actions);
+    ::posix_spawn_file_actions_adddup2(&actions, output[1], STDOUT_FILENO);
+    const int error = ::posix_spawn(&m_process, arguments[0], &actions, nullptr, arguments.data(), environ);
+    ::posix_spawn_file_actions_destroy(&actions);
+    ::close(output[1]);
+    if (error == 0)
+        readServices(output[0]);
+    ::close(output[0]);
+    if (error != 0)
+        throw std::runtime_error("the simulator does not start: " + words[0]);
+}
+
+SimulatorProcess::~SimulatorProcess()
+{
+    ::kill(m_process, SIGTERM);
+    ::waitpid(m_process, nullptr, 0);
+}
+
+void SimulatorProcess::readServices(int output)
+{
+    std::string text;
+    while (text.find("ready\n") == text.npos) {
+        pollfd watched{output, POLLIN, 0};
+        std::array<char, 1024> piece;
+        const ssize_t got = ::poll(&watched, 1, Patience) == 1 ? ::read(output, piece.data(), piece.size()) : -1;
+        if (got <= 0) {
+            ::kill(m_process, SIGKILL);
+            ::waitpid(m_process, nullptr, 0);
+            throw std::runtime_error("the simulator never got ready, it said: " + text);
+        }
+        text.append(piece.data(), static_cast<std::size_t>(got));
+    }
+    std::istringstream lines(text);
+    for (std::string line; std::getline(lines, line);) {
+        const std::size_t first = line.find(' ');
+        const std::size_t last = line.rfind(' ');
+        if (first != line.npos)
+            m_resources[line.substr(0, first)] = line.substr(last + 1);
+    }
+}
+
+std::string SimulatorProcess::resource(const std::string &service) const
+{
+    const auto found = m_resources.find(service);
+    return found == m_resources.end() ? std::string() : found->second;
+}
+
+} // namespace test

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <map>
+#include <string>
+#include <sys/types.h>
+#include <vector>
+
+namespace test
+{
+
+/// A KyVisaSimulator of its own, on free ports. Ends with the object.
+class SimulatorProcess
+{
+public:
+    /// Waits until it says that it is ready. @param options beside those, for example "--hislip 0".
+    explicit SimulatorProcess(const std::vector<std::string> &options);
+    ~SimulatorProcess();
+    SimulatorProcess(const SimulatorProcess &) = delete;
+    SimulatorProcess &operator=(const SimulatorProcess &) = delete;
+
+    /// The resource string of a service ("hislip", "socket"); empty when it is not served.
+    std::string resource(const std::string &service) const;
+    pid_t id() const { return m_process; }
+
+private:
+    void readServices(int output);
+
+    pid_t m_process = -1;
+    std::map<std::string, std::string> m_resources;
+};
+
+} // namespace test
