@@ -32,7 +32,7 @@ BasicTab::BasicTab(VisaFunctionCallHandler *handler, QWidget *parent)
       m_clear(new VisaFunctionCallButton(handler, VisaFunctionCallTyp::Clear, this)),
       m_readCountLabel(new QLabel(this)), m_readCount(new SpinBoxParameter(this)), m_statusByte(new QLabel(this)),
       m_sendEnd(new QCheckBox(this)), m_readView(new QPlainTextEdit(this)), m_clearText(new QPushButton(this)),
-      m_clearHistory(new QPushButton(this))
+      m_clearHistory(new QPushButton(this)), m_statusByteTimer(this)
 {
     m_write->setParameter(m_command);
     m_read->setParameter(m_readCount);
@@ -57,6 +57,7 @@ void BasicTab::setupUi()
     m_readView->setReadOnly(true);
     m_readView->setUndoRedoEnabled(false); // otherwise each read would be kept twice
     m_statusByteTimer.setSingleShot(true);
+    m_statusByteTimer.setTimerType(Qt::PreciseTimer);
     timeup();
 
     // Request buttons answer the mouse only; keeping them out of the tab chain leaves no stop where the keys do nothing,
@@ -71,15 +72,15 @@ void BasicTab::setupUi()
     grid->addWidget(m_read, 1, 1);
     grid->addWidget(m_query, 1, 2);
     grid->addWidget(m_sendEnd, 1, 3);
-    grid->addWidget(m_readCountLabel, 2, 0);
-    grid->addWidget(m_readCount, 2, 1, 1, 2);
-    grid->addWidget(m_clearText, 2, 3);
-    grid->addWidget(m_readView, 3, 0, 1, 4);
-    grid->addWidget(m_readStb, 4, 0);
-    grid->addWidget(m_statusByte, 4, 1);
-    grid->addWidget(m_trigger, 4, 2);
-    grid->addWidget(m_clear, 4, 3);
-    grid->setRowStretch(3, 1);
+    grid->addWidget(m_readStb, 2, 0);
+    grid->addWidget(m_statusByte, 2, 1);
+    grid->addWidget(m_trigger, 2, 2);
+    grid->addWidget(m_clear, 2, 3);
+    grid->addWidget(m_readCountLabel, 3, 0);
+    grid->addWidget(m_readCount, 3, 1, 1, 2);
+    grid->addWidget(m_clearText, 3, 3);
+    grid->addWidget(m_readView, 4, 0, 1, 4);
+    grid->setRowStretch(4, 1);
 
     setTabOrder(m_command, m_clearHistory);
     setTabOrder(m_clearHistory, m_sendEnd);

@@ -89,6 +89,14 @@ void ResourceFrame::setupUi()
     row->addLayout(m_accessMode);
     row->addLayout(timeout);
     row->addLayout(logSwitches);
+
+    QWidget *previous = m_resource;
+    for (QWidget *next :
+         {m_accessMode->itemAt(0)->widget(), m_accessMode->itemAt(1)->widget(), static_cast<QWidget *>(m_timeout),
+          static_cast<QWidget *>(m_showLog), static_cast<QWidget *>(m_writeLog)}) {
+        setTabOrder(previous, next);
+        previous = next;
+    }
 }
 
 void ResourceFrame::setResourceName(ResourceName *name)

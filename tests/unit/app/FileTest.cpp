@@ -109,6 +109,16 @@ TEST_F(DataStore, ReplacesALongerFile)
     EXPECT_EQ(content(), "000001000002ab");
 }
 
+TEST_F(DataStore, WritesInPlaceSoThatALinkStaysALink)
+{
+    QDir().mkpath(m_folder);
+    ASSERT_TRUE(QFile::link(m_folder + "/kept-elsewhere", m_path));
+    File().saveData();
+    EXPECT_TRUE(QFileInfo(m_path).isSymLink());
+    EXPECT_TRUE(QFileInfo(m_folder + "/kept-elsewhere").isFile());
+    EXPECT_EQ(content(), "000001");
+}
+
 TEST_F(DataStore, ReadsBackWhatItWrote)
 {
     EXPECT_EQ(readInto(QByteArray("000001000003abc000000000004\0\n\xFFz", 31)),

@@ -239,6 +239,27 @@ TEST_F(MainWindowTest, RemembersThatItWasMaximised)
     EXPECT_TRUE(window.isMaximized());
 }
 
+TEST_F(MainWindowTest, TakesSizeAndPositionAsTheyAreStored)
+{
+    {
+        QSettings settings;
+        settings.setValue("MainWindow/size", QSize(5000, 4000));
+        settings.setValue("MainWindow/pos", QPoint(-3000, 9000));
+    }
+    MainWindow window(nullptr);
+    EXPECT_EQ(window.size(), QSize(5000, 4000));
+    EXPECT_EQ(window.pos(), QPoint(-3000, 9000));
+}
+
+TEST_F(MainWindowTest, AStoredSizeOfNothingStillShowsAWindow)
+{
+    QSettings().setValue("MainWindow/size", QSize(0, 0));
+    MainWindow window(nullptr);
+    window.show();
+    EXPECT_GE(window.width(), window.minimumSizeHint().width());
+    EXPECT_GE(window.height(), window.minimumSizeHint().height());
+}
+
 TEST_F(MainWindowTest, StartsOnSettingsThatMakeNoSense)
 {
     {

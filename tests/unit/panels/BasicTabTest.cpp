@@ -170,6 +170,14 @@ TEST_F(BasicTabTest, ShowsInvalidUtf8AsReplacementCharacters)
     EXPECT_EQ(shown(), QString(QChar(0xFC)) + QChar(0xFFFD) + "!");
 }
 
+TEST_F(BasicTabTest, TheReadViewCannotBeTypedInto)
+{
+    finish(data(Kind::Read, "one"));
+    m_tab.show();
+    QTest::keyClicks(m_view, "xyz");
+    EXPECT_EQ(shown(), "one");
+}
+
 TEST_F(BasicTabTest, WriteAndQueryEmptyTheViewBeforeTheirAnswerReadDoesNot)
 {
     finish(data(Kind::Read, "old"));
@@ -275,11 +283,13 @@ TEST_F(BasicTabTest, AFreshStatusByteIsGreenAndLaterBlackWithItsValueLeft)
 TEST_F(BasicTabTest, OneTimerServesTheStatusByteAndEachReadingRestartsIt)
 {
     finish(statusByte(1));
-    const auto timers = m_tab.findChildren<QTimer *>();
-    EXPECT_TRUE(timers.isEmpty());
-    m_tab.timeup();
-    EXPECT_EQ(m_stb->styleSheet(), "QLabel { color: black }");
+    const auto timers = m_tab.findChildren<QTimer *>(QString(), Qt::FindDirectChildrenOnly);
+    ASSERT_EQ(timers.size(), 1);
+    EXPECT_TRUE(timers[0]->isSingleShot());
+    EXPECT_EQ(timers[0]->interval(), 4000);
+    ASSERT_TRUE(QTest::qWaitFor([&timers] { return timers[0]->remainingTime() < 3000; }, 30000));
     finish(statusByte(2));
+    EXPECT_GT(timers[0]->remainingTime(), 3000);
     EXPECT_EQ(m_stb->styleSheet(), "QLabel { color: green }");
 }
 
@@ -335,6 +345,12 @@ TEST_F(BasicTabTest, HotkeysWorkFromTheCommandLineAndTheReadView)
     finish(result(Kind::Write));
     QTest::keyClick(m_view, Qt::Key_R, Qt::ControlModifier);
     EXPECT_EQ(requests().size(), 1u);
+}
+
+TEST_F(BasicTabTest, TabFollowsTheEyeAndPassesTheRequestButtonsBy)
+{
+    EXPECT_EQ(tabOrder(m_tab, m_command), QStringList({"basicCommand", "basicClearHistory", "basicSendEnd",
+                                                       "basicReadCount", "basicClearText", "basicReadView"}));
 }
 
 TEST_F(BasicTabTest, EveryWidgetHasANameAndInputsAnAccessibleOne)

@@ -149,6 +149,36 @@ INSTANTIATE_TEST_SUITE_P(
                     EscapeRow{R"(\x5C\x5C)", R"(\)"}, EscapeRow{R"(\a\N)", R"(\a\N)"}, EscapeRow{R"(\)", R"(\)"},
                     EscapeRow{"gr\xC3\xBC\xC3\x9F", "gr\xC3\xBC\xC3\x9F"}));
 
+TEST(EscapeRules, ThreeHexadecimalDigitsComeBeforeTwo)
+{
+    ScipiLineEdit line(nullptr);
+    EXPECT_EQ(sent(line, R"(\x41B)"), "\x1B");
+}
+
+TEST(EscapeRules, ADoubledBackslashProtectsNothing)
+{
+    ScipiLineEdit line(nullptr);
+    EXPECT_EQ(sent(line, R"(\\n)"), "\\\n");
+}
+
+TEST(EscapeRules, BackslashZeroIsDeletedAndYieldsNoZeroByte)
+{
+    ScipiLineEdit line(nullptr);
+    EXPECT_EQ(sent(line, R"(a\0b)"), "ab");
+}
+
+TEST(EscapeRules, AnExpandedBackslashStartsTheNextEscape)
+{
+    ScipiLineEdit line(nullptr);
+    EXPECT_EQ(sent(line, R"(\x5Cx41)"), "A");
+}
+
+TEST(EscapeRules, CodesAbove127AreSentAsUtf8)
+{
+    ScipiLineEdit line(nullptr);
+    EXPECT_EQ(sent(line, R"(\xFF)"), "\xC3\xBF");
+}
+
 class CommandLineKeys : public testing::Test
 {
 protected:

@@ -6,6 +6,7 @@
 
 #include <QCoreApplication>
 #include <QObject>
+#include <QStringList>
 #include <QTest>
 #include <QWidget>
 
@@ -51,6 +52,19 @@ protected:
         auto *widget = parent.findChild<Widget *>(QString::fromLatin1(name));
         EXPECT_NE(widget, nullptr) << name;
         return widget;
+    }
+
+    /// Names of the widgets that the Tab key visits, beginning with @p first.
+    static QStringList tabOrder(const QWidget &panel, QWidget *first)
+    {
+        QStringList names;
+        QWidget *widget = first;
+        do {
+            if (panel.isAncestorOf(widget) && (widget->focusPolicy() & Qt::TabFocus) && !widget->focusProxy())
+                names << widget->objectName();
+            widget = widget->nextInFocusChain();
+        } while (widget != first);
+        return names;
     }
 
     static void press(QWidget *widget) { QTest::mouseClick(widget, Qt::LeftButton); }

@@ -125,6 +125,12 @@ TEST_F(ResourceFrameTest, ShowsANameThatIsRestored)
     EXPECT_EQ(m_line->text(), "VXI0::1::INSTR");
 }
 
+TEST_F(ResourceFrameTest, TabFollowsTheEyeAndPassesTheRequestButtonsBy)
+{
+    EXPECT_EQ(tabOrder(m_frame, m_line), QStringList({"resourceName", "openExclusiveLock", "openLoadConfig",
+                                                      "openTimeout", "showLog", "writeLog"}));
+}
+
 TEST_F(ResourceFrameTest, WithoutAResourceNamePressesStillSend)
 {
     ResourceFrame frame(m_handler.get(), nullptr);
