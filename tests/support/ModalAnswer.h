@@ -2,6 +2,8 @@
 
 #include <QApplication>
 #include <QDialog>
+#include <QFileDialog>
+#include <QMessageBox>
 #include <QTimer>
 
 #include <functional>
@@ -14,7 +16,7 @@
  *     ... what opens the dialog ...
  *     EXPECT_EQ(box.count(), 1);
  *
- * A modal dialog of another name is rejected, so that an unexpected one fails the test instead of stopping it.
+ * A message box or file dialog of another name is rejected, so that an unexpected one fails the test instead of stopping it.
  */
 class ModalAnswer
 {
@@ -35,10 +37,13 @@ private:
         auto *dialog = qobject_cast<QDialog *>(QApplication::activeModalWidget());
         if (!dialog || !dialog->isVisible())
             return;
+        // Until a box is active, shortcuts of the window behind it take its keys.
+        if (qobject_cast<QMessageBox *>(dialog) && !dialog->isActiveWindow())
+            return;
         if (dialog->objectName() == m_name) {
             ++m_count;
             m_answer(dialog);
-        } else {
+        } else if (qobject_cast<QMessageBox *>(dialog) || qobject_cast<QFileDialog *>(dialog)) {
             ++m_unexpected;
             dialog->reject();
         }
