@@ -14,5 +14,5 @@ if(KYVISA_SANITIZE)
   add_compile_options(-fsanitize=${KYVISA_SANITIZE} -fno-sanitize-recover=all -O1)
   add_link_options(-fsanitize=${KYVISA_SANITIZE})
   # gcc 12 reports false positives of these two when it instruments code.
-  add_compile_options(-Wno-maybe-uninitialized -Wno-restrict)
+  add_compile_options($<$<COMPILE_LANG_AND_ID:CXX,GNU>:-Wno-maybe-uninitialized> $<$<COMPILE_LANG_AND_ID:CXX,GNU>:-Wno-restrict>)
 endif()
