@@ -15,9 +15,30 @@ constexpr std::size_t FirstRoom = 64 * 1024;
 bool ByteBudget::take(std::size_t bytes)
 {
     if (bytes > m_capacity - m_used)
+        dropSpare();
+    if (bytes > m_capacity - m_used)
         return false;
     m_used += bytes;
     return true;
+}
+
+ByteBudget::Room ByteBudget::takeSpare(std::size_t most)
+{
+    return m_spare.capacity <= most ? std::exchange(m_spare, {}) : Room{};
+}
+
+void ByteBudget::keepSpare(Room room)
+{
+    if (room.capacity > m_spare.capacity && room.capacity <= MaxSpare)
+        std::swap(room, m_spare);
+    std::free(room.data);
+    give(room.capacity);
+}
+
+void ByteBudget::dropSpare()
+{
+    std::free(m_spare.data);
+    give(std::exchange(m_spare, {}).capacity);
 }
 
 Bytes::Bytes(Bytes &&other) noexcept
@@ -45,8 +66,7 @@ Bytes::~Bytes()
 
 void Bytes::release()
 {
-    std::free(m_data);
-    m_budget->give(m_capacity);
+    m_budget->keepSpare({m_data, m_capacity});
     m_data = nullptr;
     m_size = m_capacity = 0;
 }
@@ -55,6 +75,11 @@ std::span<std::byte> Bytes::space(std::size_t expected)
 {
     if (expected == 0)
         return {};
+    if (m_capacity == 0 && expected > FirstRoom) {
+        const ByteBudget::Room room = m_budget->takeSpare(expected);
+        m_data = room.data;
+        m_capacity = room.capacity;
+    }
     if (m_size == m_capacity) {
         // Doubling, but never beyond what is announced; close to the budget's end in smaller steps.
         std::size_t room = std::min(expected, std::max(FirstRoom, m_capacity));

@@ -7,20 +7,40 @@
 namespace simulator
 {
 
-/// The memory that all blocks share, the ones on their way in and the stored ones, so that no set of clients can eat the machine's.
+/**
+ * The memory that all blocks share, the ones on their way in and the stored ones, so that no set of clients can eat the machine's. The room
+ * of one block that has gone is kept for the next one: fresh memory costs the kernel more time than receiving into it.
+ */
 class ByteBudget
 {
 public:
+    /// Larger rooms are given back at once.
+    static constexpr std::size_t MaxSpare = std::size_t{128} << 20;
+
+    struct Room {
+        std::byte *data = nullptr;
+        std::size_t capacity = 0;
+    };
+
     explicit ByteBudget(std::size_t capacity) : m_capacity(capacity) {}
+    ~ByteBudget() { dropSpare(); }
+    ByteBudget(const ByteBudget &) = delete;
+    ByteBudget &operator=(const ByteBudget &) = delete;
 
     bool take(std::size_t bytes);
     void give(std::size_t bytes) { m_used -= bytes; }
+    /// A kept room of at most @p most bytes, taken already; none: data is null.
+    Room takeSpare(std::size_t most);
+    void keepSpare(Room room);
     std::size_t capacity() const { return m_capacity; }
-    std::size_t used() const { return m_used; }
+    std::size_t used() const { return m_used - m_spare.capacity; }
 
 private:
+    void dropSpare();
+
     std::size_t m_capacity;
     std::size_t m_used = 0;
+    Room m_spare;
 };
 
 /**

@@ -43,8 +43,7 @@ InputBuffer::Found InputBuffer::scanText(std::span<const std::byte> &bytes)
         const bool inHeaderOfBlock =
             m_state == State::BlockStart || m_state == State::BlockDigits || m_state == State::BlockLong;
         if (inHeaderOfBlock) {
-            blockHeader(c);
-            if (m_state != State::Data)
+            if (blockHeader(c))
                 continue;
             // No block after all: the byte counts like any other of the text.
         }
@@ -95,7 +94,7 @@ InputBuffer::Found InputBuffer::scanText(std::span<const std::byte> &bytes)
     return finish(found);
 }
 
-void InputBuffer::blockHeader(char c)
+bool InputBuffer::blockHeader(char c)
 {
     const bool digit = c >= '0' && c <= '9';
     const auto value = static_cast<std::uint64_t>(c - '0');
@@ -104,18 +103,18 @@ void InputBuffer::blockHeader(char c)
     if (state == State::BlockStart) {
         if (c == '0' && m_hasEnd) {
             beginBlock(std::numeric_limits<std::uint64_t>::max(), State::Indefinite);
-        } else if (digit && c != '0') {
-            store(c);
-            m_headerDigits = static_cast<unsigned>(value);
-            m_blockLength = 0;
-            m_state = State::BlockDigits;
-        } else if (c == '(') {
-            store(c);
-            m_headerDigits = MaxLongDigits;
-            m_blockLength = 0;
-            m_state = State::BlockLong;
+            return true;
         }
-    } else if (digit && m_headerDigits > 0) {
+        const bool counted = digit && c != '0';
+        if (!counted && c != '(')
+            return false;
+        store(c);
+        m_headerDigits = counted ? static_cast<unsigned>(value) : MaxLongDigits;
+        m_blockLength = 0;
+        m_state = counted ? State::BlockDigits : State::BlockLong;
+        return true;
+    }
+    if (digit && m_headerDigits > 0) {
         store(c);
         m_blockLength = m_blockLength * 10 + value;
         --m_headerDigits;
@@ -123,9 +122,13 @@ void InputBuffer::blockHeader(char c)
             beginBlock(m_blockLength, State::Definite);
         else
             m_state = state;
-    } else if (state == State::BlockLong && c == ')' && m_headerDigits < MaxLongDigits) {
-        beginBlock(m_blockLength, State::Definite);
+        return true;
     }
+    if (state == State::BlockLong && c == ')' && m_headerDigits < MaxLongDigits) {
+        beginBlock(m_blockLength, State::Definite);
+        return true;
+    }
+    return false;
 }
 
 void InputBuffer::beginBlock(std::uint64_t length, State state)

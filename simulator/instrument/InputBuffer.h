@@ -82,8 +82,8 @@ private:
     Found finish(Found found);
     void store(char c);
     void countBytes(std::size_t count);
-    /// Next state for a byte of a block's header.
-    void blockHeader(char c);
+    /// Takes a byte of a block's header. False when it makes that no block header at all.
+    bool blockHeader(char c);
 
     std::shared_ptr<ByteBudget> m_budget;
     const InputLimits m_limits;

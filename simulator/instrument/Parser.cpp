@@ -213,11 +213,15 @@ Parameter Reader::readNumber()
 
 void Reader::readSuffix(Parameter &number)
 {
+    const std::size_t behindNumber = m_at;
     skipWhiteSpace();
+    const bool apart = m_at > behindNumber;
     const std::string_view suffix = take([](char c) { return isLetter(c) || c == '/' || c == '.'; });
     if (suffix.size() > MaxMnemonic)
         throw ScpiError{-131, std::string{suffix}};
     number.suffix = upper(suffix);
+    if (suffix.empty() && apart)
+        return; // what stands here is no part of the number
     if (!atEnd() && !isWhiteSpace(peek()) && peek() != ',')
         throw ScpiError{suffix.empty() ? -121 : -131, std::string{peek()}};
 }
