@@ -15,10 +15,11 @@ ROOT = pathlib.Path(sys.argv[1] if len(sys.argv) > 1 else pathlib.Path(__file__)
 INCLUDE = re.compile(r'^\s*#\s*include\s*"((?:panels|pipeline|finder|instrtests|config|log|visa)/[^"]+|app/(?!MainWindow\.h)[^"]+)"')
 # Members of widgets and panels that act: a person has a mouse and a keyboard instead.
 ACTS = re.compile(
-    r"(?:->|\.)\s*(click|animateClick|toggle|trigger|setChecked|setCheckState|setText|setPlainText|setValue|setCurrentIndex|"
+    r"(?:->|\.)\s*(?:click|animateClick|toggle|trigger|setChecked|setCheckState|setText|setPlainText|setValue|setCurrentIndex|"
     r"setCurrentText|setEditText|selectAll|insert|insertItem|addItem|clearEditText|copy|paste|sendFunctionCall|sendVisaFunctionCall|"
     r"getCommand|getParameter|setName|setStatus|visaFunctionCallFinished|newVisaCallStarted|setVisible|setEnabled|setFocus|"
-    r"stepUp|stepDown|stepBy|selectRow|setCurrentCell|setRangeSelected|accept|reject)\s*\("
+    r"stepUp|stepDown|stepBy|selectRow|setCurrentCell|setRangeSelected|reject)\s*\(|"
+    r"(?<!peer)(?:->|\.)\s*accept\s*\("  # a scripted peer accepts connections
 )
 INVOKE = re.compile(r"QMetaObject::invokeMethod|qobject_cast<\s*(?:BasicTab|ResourceFrame|ScipiLineEdit|LogTextDisplay|SessionInstanceTab)")
 ALLOWED = re.compile(r"//\s*acts as the system:")
