@@ -1,6 +1,8 @@
 #include "app/MainWindow.h"
 
 #include "app/SessionInstanceTab.h"
+#include "finder/ResourceDialog.h"
+#include "log/LogFileOptionsDialog.h"
 #include "panels/StatusLabel.h"
 #include "pipeline/VisaDispatcher.h"
 
@@ -8,6 +10,7 @@
 
 #include <QAction>
 #include <QGuiApplication>
+#include <QPointer>
 #include <QProcess>
 #include <QScreen>
 #include <QSettings>
@@ -75,10 +78,13 @@ void MainWindow::setupUi()
         QAction *action = toolBar->addAction(text);
         action->setObjectName(QLatin1String(name));
         action->setToolTip(toolTip);
+        toolBar->widgetForAction(action)->setObjectName(QLatin1String(name) + QLatin1String("Button"));
         return action;
     };
-    addAction(tr("Find Resource"), "actionFindResource", tr("Search for instruments."))->setEnabled(false);
-    addAction(tr("Logging"), "actionLogging", tr("Choose the log file and its folder."))->setEnabled(false);
+    connect(addAction(tr("Find Resource"), "actionFindResource", tr("Search for instruments.")), &QAction::triggered,
+            this, &MainWindow::findResource);
+    connect(addAction(tr("Logging"), "actionLogging", tr("Choose the log file and its folder.")), &QAction::triggered,
+            this, &MainWindow::showLoggingDialog);
     connect(addAction(tr("KyVisa Config"), "actionKyVisaConfig", tr("Configure the VISA library.")),
             &QAction::triggered, this, &MainWindow::kyVisaConfigClicked);
     connect(addAction(tr("KyVisa TraceTool"), "actionKyVisaTraceTool", tr("Watch the calls of VISA programs.")),
@@ -97,6 +103,24 @@ void MainWindow::setupUi()
 
 /// Nothing to connect beyond what the widgets' set-up connects.
 void MainWindow::setupConnections() {}
+
+// Both dialogs may end with the window, while their event loops run.
+
+void MainWindow::findResource()
+{
+    const QPointer<ResourceDialog> dialog(new ResourceDialog(m_sessionTab->getVisaFunctionCallHandler(), this));
+    if (dialog->exec() == QDialog::Accepted && dialog)
+        m_sessionTab->getResourceName()->setName(dialog->getSelectedResource());
+    delete dialog;
+}
+
+void MainWindow::showLoggingDialog()
+{
+    const QPointer<LogFileOptionsDialog> dialog(new LogFileOptionsDialog(m_sessionTab->getLogFile(), this));
+    dialog->setModal(true);
+    dialog->exec();
+    delete dialog; // applies what was chosen
+}
 
 void MainWindow::kyVisaConfigClicked()
 {

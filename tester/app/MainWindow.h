@@ -28,6 +28,8 @@ public:
     void newVisaCallStarted(const VisaFunctionCallTyp &type) override;
 
 public slots:
+    void findResource();
+    void showLoggingDialog();
     void kyVisaConfigClicked();
     void kyVisaTraceToolClicked();
     /// Asks for the three attributes that the title is made of.

@@ -3,5 +3,5 @@ tester_library(tester-app
     app/File.cpp
     app/MainWindow.cpp
     app/SessionInstanceTab.cpp
-  LIBRARIES tester-panels tester-logview tester-worker tester-log tester-base Qt5::Widgets
+  LIBRARIES tester-dialogs tester-panels tester-logview tester-worker tester-log tester-base Qt5::Widgets
 )
