@@ -407,6 +407,7 @@ extern "C" {
 
 #define VI_TMO_IMMEDIATE (0)
 #define VI_TMO_INFINITE  (0xFFFFFFFFUL)
+#define VI_INFINITE      VI_TMO_INFINITE /* its old name */
 
 /* ---- Interface type ---------------------------------------------------------------------------------------------- */
 
