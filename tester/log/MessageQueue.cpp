@@ -1,7 +1,18 @@
 #include "log/MessageQueue.h"
 
+#include <algorithm>
+#include <chrono>
+#include <thread>
+
 namespace
 {
+// To wake a blocked consumer costs the producer a system call for each line until the consumer runs, ten times what a line
+// costs otherwise. While lines come, the consumer therefore looks for the next one at growing intervals; it blocks only when
+// none came for a while. The longest interval is far below the time in which a producer could fill the queue.
+constexpr std::chrono::microseconds ShortestDoze(20);
+constexpr std::chrono::microseconds LongestDoze(2000);
+constexpr int Dozes = 500; // about a second
+
 constexpr int WakeUpPermits = 100; // more threads than ever log to one session
 
 constexpr std::uint32_t next(std::uint32_t index)
@@ -45,7 +56,7 @@ bool MessageQueue::pop(FastBuffer &line)
 {
     if (m_stopped)
         return false;
-    m_used.acquire();
+    awaitLine();
     if (m_stopped)
         return false;
     const std::uint32_t index = m_read;
@@ -53,6 +64,18 @@ bool MessageQueue::pop(FastBuffer &line)
     m_read = next(index);
     m_free.release();
     return true;
+}
+
+void MessageQueue::awaitLine()
+{
+    std::chrono::microseconds doze = ShortestDoze;
+    for (int i = 0; i < Dozes; ++i) {
+        if (m_used.tryAcquire())
+            return;
+        std::this_thread::sleep_for(doze);
+        doze = std::min(2 * doze, LongestDoze);
+    }
+    m_used.acquire();
 }
 
 void MessageQueue::stop()

@@ -37,6 +37,8 @@ public:
     void stop();
 
 private:
+    void awaitLine();
+
     std::array<FastBuffer, Slots> m_ring;
     std::uint32_t m_write = 0;            ///< guarded by m_mutex
     std::atomic<std::uint32_t> m_read{0}; ///< the consumer's; producers look at it once stopped
