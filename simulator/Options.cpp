@@ -46,7 +46,7 @@ std::optional<int> parseOptions(int argc, const char *const *argv, Options &opti
                    "Address to listen on, may be repeated (default: 127.0.0.1 and, where there is one, ::1)")
         ->type_name("ADDRESS")
         ->allow_extra_args(false)
-        ->check(CLI::Validator(checkAddress, ""));
+        ->transform(CLI::Validator(checkAddress, ""));
     app.add_option("--hislip", options.hislip, "Serve HiSLIP on this port; 0 takes a free one")->type_name("PORT");
     app.add_flag("--hislip-ignore-unread", ignoreUnread,
                  "Report no -410 for an unread HiSLIP response, for clients that never say that they have read one");

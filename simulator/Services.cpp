@@ -83,12 +83,16 @@ bool Services::listenOnAll(const std::string &name, std::uint16_t port, const Ac
     return true;
 }
 
+void noteExposure(const std::vector<ListenAddress> &addresses, std::ostream &notes)
+{
+    for (const ListenAddress &address : addresses)
+        if (!address.isLoopback())
+            notes << "KyVisaSimulator: listening on " << address.text << ": other machines can reach this instrument\n";
+}
+
 void Services::announce(std::ostream &out, std::ostream &notes) const
 {
-    for (const ListenAddress &address : m_options.listen)
-        if (!address.isLoopback())
-            notes << "KyVisaSimulator: listening on " << address.text << ": other machines can reach this instrument"
-                  << std::endl;
+    noteExposure(m_options.listen, notes);
     for (const std::string &line : m_lines)
         out << line << '\n';
     out << "ready" << std::endl;

@@ -14,6 +14,9 @@
 namespace simulator
 {
 
+/// Says in one line for each address that other machines can reach that they can.
+void noteExposure(const std::vector<ListenAddress> &addresses, std::ostream &notes);
+
 /// The instrument and every way to it that the options ask for.
 class Services
 {

@@ -48,8 +48,17 @@ SimulatorProcess::SimulatorProcess(const std::vector<std::string> &options)
 
 SimulatorProcess::~SimulatorProcess()
 {
-    ::kill(m_process, SIGTERM);
-    ::waitpid(m_process, nullptr, 0);
+    if (m_process > 0)
+        stop(SIGTERM);
+}
+
+int SimulatorProcess::stop(int signal)
+{
+    int status = 0;
+    ::kill(m_process, signal);
+    ::waitpid(m_process, &status, 0);
+    m_process = -1;
+    return WIFEXITED(status) ? WEXITSTATUS(status) : 256 + WTERMSIG(status);
 }
 
 void SimulatorProcess::readServices(int output)
@@ -79,6 +88,14 @@ std::string SimulatorProcess::resource(const std::string &service) const
 {
     const auto found = m_resources.find(service);
     return found == m_resources.end() ? std::string() : found->second;
+}
+
+std::uint16_t SimulatorProcess::port(const std::string &service) const
+{
+    const std::string name = resource(service);
+    const std::size_t end = name.rfind("::");
+    const std::size_t begin = end == name.npos ? name.npos : name.find_last_of(":,", end - 1);
+    return begin == name.npos ? 0 : static_cast<std::uint16_t>(std::stoi(name.substr(begin + 1, end - begin - 1)));
 }
 
 } // namespace test

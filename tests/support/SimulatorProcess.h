@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <map>
 #include <string>
 #include <sys/types.h>
@@ -20,6 +21,10 @@ public:
 
     /// The resource string of a service ("hislip", "socket"); empty when it is not served.
     std::string resource(const std::string &service) const;
+    /// Port of a service.
+    std::uint16_t port(const std::string &service) const;
+    /// Sends the signal and waits. The exit status; 256 and the signal's number when one ended it.
+    int stop(int signal);
     pid_t id() const { return m_process; }
 
 private:
