@@ -236,7 +236,11 @@ TEST_F(LogFileOptions, AFileThatCannotBeOpenedLeavesTheLogWhereItIs)
     auto *edit = find<QLineEdit>("logFileEdit");
     QTest::keyClick(edit, Qt::Key_A, Qt::ControlModifier);
     QTest::keyClicks(edit, home("no such folder/log.txt"));
+    ModalAnswer none("", [](QDialog *) {});
     finish(QDialogButtonBox::Ok);
+    for (const QWidget *window : QApplication::topLevelWidgets())
+        EXPECT_FALSE(window->isVisible()) << "no message: " << window->objectName().toStdString();
+    EXPECT_EQ(none.unexpected(), 0);
     EXPECT_EQ(m_switches, 0);
     EXPECT_EQ(m_logFile->getCurrentFileName(), m_first);
 }
