@@ -1,6 +1,7 @@
 #include "simulator/Options.h"
 
 #include "simulator/instrument/Instrument.h"
+#include "wire/Portmap.h"
 
 #include <CLI/CLI.hpp>
 
@@ -15,6 +16,7 @@ namespace
 
 constexpr std::uint16_t DefaultHislipPort = 4880;
 constexpr std::uint16_t DefaultSocketPort = 5025;
+constexpr std::uint16_t AnyPort = 0; ///< VXI-11 has none of its own: clients ask the portmapper
 constexpr std::size_t LeastMaxMessage = 1024;
 constexpr std::size_t MostMaxMessage = std::size_t{16} << 30;
 
@@ -39,8 +41,10 @@ std::optional<int> parseOptions(int argc, const char *const *argv, Options &opti
     options.maxMessage = InstrumentOptions{}.maxMessage;
     bool ignoreUnread = false;
 
-    CLI::App app{"A simulated instrument for VISA programs: IEEE 488.2 and SCPI over HiSLIP and raw sockets.\n"
-                 "Without any service option it serves HiSLIP on port 4880 and the raw socket on port 5025."};
+    CLI::App app{
+        "A simulated instrument for VISA programs: IEEE 488.2 and SCPI over HiSLIP, VXI-11 and raw sockets.\n"
+        "Without any service option it serves HiSLIP on port 4880, the raw socket on port 5025, and VXI-11 with a "
+        "portmapper on port 111 where that may be had."};
     app.name("KyVisaSimulator");
     app.add_option("--listen", listen,
                    "Address to listen on, may be repeated (default: 127.0.0.1 and, where there is one, ::1)")
@@ -51,6 +55,14 @@ std::optional<int> parseOptions(int argc, const char *const *argv, Options &opti
     app.add_flag("--hislip-ignore-unread", ignoreUnread,
                  "Report no -410 for an unread HiSLIP response, for clients that never say that they have read one");
     app.add_option("--socket", options.socket, "Serve the raw socket on this port; 0 takes a free one")
+        ->type_name("PORT");
+    app.add_option("--vxi11", options.vxi11,
+                   "Serve VXI-11 on this port; 0 takes a free one. Without --portmapper also a portmapper on port 111, "
+                   "where that may be had")
+        ->type_name("PORT");
+    app.add_option("--portmapper", options.portmapper,
+                   "Serve a portmapper, which tells clients the port of VXI-11, on this TCP and UDP port; 0 takes a "
+                   "free one")
         ->type_name("PORT");
     app.add_option("--max-message", options.maxMessage, "Longest program message in bytes (default: 1 GiB and 64 KiB)")
         ->type_name("BYTES")
@@ -71,9 +83,14 @@ std::optional<int> parseOptions(int argc, const char *const *argv, Options &opti
     }
 
     options.reportUnread = !ignoreUnread;
-    if (!options.hislip && !options.socket) {
+    if (!options.hislip && !options.socket && !options.vxi11 && !options.portmapper) {
         options.hislip = DefaultHislipPort;
         options.socket = DefaultSocketPort;
+        options.vxi11 = AnyPort;
+    }
+    if (options.vxi11 && !options.portmapper) {
+        options.portmapper = wire::portmap::DefaultPort;
+        options.portmapperIsOptional = true;
     }
     for (const std::string &address : listen)
         options.listen.push_back({address, false});

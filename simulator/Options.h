@@ -1,6 +1,6 @@
 #pragma once
 
-#include "simulator/server/Listener.h"
+#include "simulator/server/ListenAddress.h"
 
 #include <cstdint>
 #include <optional>
@@ -14,6 +14,10 @@ struct Options {
     std::vector<ListenAddress> listen;
     std::optional<std::uint16_t> hislip;
     std::optional<std::uint16_t> socket;
+    std::optional<std::uint16_t> vxi11;
+    std::optional<std::uint16_t> portmapper;
+    /// The portmapper was not asked for, VXI-11 without one was: not to have it is no error.
+    bool portmapperIsOptional = false;
     std::size_t maxMessage = 0;
     bool reportUnread = true;
     bool quiet = false;

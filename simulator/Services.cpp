@@ -1,5 +1,10 @@
 #include "simulator/Services.h"
 
+#include "simulator/server/BoundSocket.h"
+#include "wire/Vxi11.h"
+
+#include <sys/socket.h>
+
 #include <cerrno>
 #include <ostream>
 #include <stdexcept>
@@ -34,51 +39,105 @@ std::string hostOf(const ListenAddress &address)
 
 Services::Services(EventLoop &loop, const Options &options)
     : m_loop(loop), m_options(options), m_instrument(loop, instrumentOptions(options)),
-      m_hislip(loop, m_instrument, {.reportUnread = options.reportUnread}), m_socket(loop, m_instrument)
+      m_hislip(loop, m_instrument, {.reportUnread = options.reportUnread}), m_socket(loop, m_instrument),
+      m_vxi11(loop, m_instrument), m_portmapper(loop)
 {
     if (m_options.hislip)
-        serve(
-            "hislip", *m_options.hislip, [this](FileDescriptor socket) { m_hislip.accept(std::move(socket)); },
-            [](std::uint16_t port) { return "hislip0," + std::to_string(port) + "::INSTR"; });
+        serve({"hislip",
+               [this](FileDescriptor socket) { m_hislip.accept(std::move(socket)); },
+               [](const std::string &host, std::uint16_t port) {
+                   return "hislip TCPIP::" + host + "::hislip0," + std::to_string(port) + "::INSTR";
+               },
+               {}},
+              *m_options.hislip);
     if (m_options.socket)
-        serve(
-            "socket", *m_options.socket, [this](FileDescriptor socket) { m_socket.accept(std::move(socket)); },
-            [](std::uint16_t port) { return std::to_string(port) + "::SOCKET"; });
+        serve({"socket",
+               [this](FileDescriptor socket) { m_socket.accept(std::move(socket)); },
+               [](const std::string &host, std::uint16_t port) {
+                   return "socket TCPIP::" + host + "::" + std::to_string(port) + "::SOCKET";
+               },
+               {}},
+              *m_options.socket);
+    if (m_options.vxi11)
+        serveVxi11();
+    if (m_options.portmapper)
+        servePortmapper();
 }
 
-void Services::serve(const std::string &name, std::uint16_t port, const Accept &accept, const Resource &resource)
+void Services::serveVxi11()
+{
+    using namespace wire;
+    const std::uint16_t port =
+        serve({"vxi11",
+               [this](FileDescriptor socket) { m_vxi11.accept(std::move(socket)); },
+               [](const std::string &host, std::uint16_t) { return "vxi11 TCPIP::" + host + "::inst0::INSTR"; },
+               {}},
+              *m_options.vxi11);
+    m_vxi11.setPort(port);
+    m_portmapper.add({vxi11::CoreProgram, vxi11::Version, portmap::Tcp, port});
+    m_portmapper.add({vxi11::AbortProgram, vxi11::Version, portmap::Tcp, port});
+}
+
+void Services::servePortmapper()
+{
+    using namespace wire;
+    const Service service{
+        "portmapper", [this](FileDescriptor socket) { m_portmapper.accept(std::move(socket)); },
+        [](const std::string &host, std::uint16_t port) { return "portmapper " + host + " " + std::to_string(port); },
+        [this](FileDescriptor socket) { m_portmapper.answerOn(std::move(socket)); }};
+    try {
+        const std::uint16_t port = serve(service, *m_options.portmapper);
+        m_portmapper.add({portmap::Program, portmap::Version, portmap::Tcp, port});
+        m_portmapper.add({portmap::Program, portmap::Version, portmap::Udp, port});
+    } catch (const std::runtime_error &error) {
+        if (!m_options.portmapperIsOptional)
+            throw;
+        m_notes.push_back(std::string(error.what()) + "; VXI-11 clients cannot ask for its port, which is " +
+                          std::to_string(m_vxi11.port()));
+    }
+}
+
+std::uint16_t Services::serve(const Service &service, std::uint16_t port)
 {
     // All addresses use one port; a free one of the first may be taken on the next.
-    for (int attempt = 1; attempt < AttemptsForFreePort; ++attempt)
-        if (listenOnAll(name, port, accept, resource))
-            return;
-    throw std::runtime_error(name + ": found no port that is free on all addresses");
+    for (int attempt = 1; attempt < AttemptsForFreePort; ++attempt) {
+        std::uint16_t used = port;
+        if (listenOnAll(service, used))
+            return used;
+    }
+    throw std::runtime_error(service.name + ": found no port that is free on all addresses");
 }
 
-/// False when a port that was free on the first address is in use on another.
-bool Services::listenOnAll(const std::string &name, std::uint16_t port, const Accept &accept, const Resource &resource)
+/// False when a port that was free on the first address is in use on another, or for datagrams.
+bool Services::listenOnAll(const Service &service, std::uint16_t &port)
 {
     const bool anyPort = port == 0;
     std::vector<std::unique_ptr<Listener>> listeners;
+    std::vector<FileDescriptor> datagramSockets;
     std::vector<std::string> lines;
     for (const ListenAddress &address : m_options.listen) {
         try {
-            listeners.push_back(std::make_unique<Listener>(m_loop, address, port, accept));
+            auto listener = std::make_unique<Listener>(m_loop, address, port, service.accept);
+            port = listener->port();
+            if (service.datagrams)
+                datagramSockets.push_back(bindSocket(address, SOCK_DGRAM, port));
+            listeners.push_back(std::move(listener));
         } catch (const std::system_error &error) {
             const bool inUse = error.code().value() == EADDRINUSE;
             if (inUse && anyPort && port != 0)
                 return false;
             if (address.optional && !inUse)
                 continue;
-            throw std::runtime_error(name + ": cannot listen on " + address.text + " port " + std::to_string(port) +
-                                     ": " + error.code().message());
+            throw std::runtime_error(service.name + ": cannot listen on " + address.text + " port " +
+                                     std::to_string(port) + ": " + error.code().message());
         }
-        port = listeners.back()->port();
         if (!address.optional)
-            lines.push_back(name + " TCPIP::" + hostOf(address) + "::" + resource(port));
+            lines.push_back(service.line(hostOf(address), port));
     }
     for (auto &listener : listeners)
         m_listeners.push_back(std::move(listener));
+    for (FileDescriptor &socket : datagramSockets)
+        service.datagrams(std::move(socket));
     m_lines.insert(m_lines.end(), lines.begin(), lines.end());
     return true;
 }
@@ -93,6 +152,8 @@ void noteExposure(const std::vector<ListenAddress> &addresses, std::ostream &not
 void Services::announce(std::ostream &out, std::ostream &notes) const
 {
     noteExposure(m_options.listen, notes);
+    for (const std::string &note : m_notes)
+        notes << "KyVisaSimulator: " << note << std::endl;
     for (const std::string &line : m_lines)
         out << line << '\n';
     out << "ready" << std::endl;

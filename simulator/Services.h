@@ -4,7 +4,9 @@
 #include "simulator/instrument/Instrument.h"
 #include "simulator/server/HislipServer.h"
 #include "simulator/server/Listener.h"
+#include "simulator/server/Portmapper.h"
 #include "simulator/server/SocketServer.h"
+#include "simulator/server/Vxi11Server.h"
 
 #include <iosfwd>
 #include <memory>
@@ -29,19 +31,33 @@ public:
 
 private:
     using Accept = std::function<void(FileDescriptor)>;
-    /// Text between host and end of the resource string, for a port.
-    using Resource = std::function<std::string(std::uint16_t port)>;
+    /// The line that announces a service on a host and port.
+    using Line = std::function<std::string(const std::string &host, std::uint16_t port)>;
+    /// How a service is offered besides TCP.
+    using Datagrams = std::function<void(FileDescriptor)>;
+    struct Service {
+        std::string name;
+        Accept accept;
+        Line line;
+        Datagrams datagrams;
+    };
 
-    void serve(const std::string &name, std::uint16_t port, const Accept &accept, const Resource &resource);
-    bool listenOnAll(const std::string &name, std::uint16_t port, const Accept &accept, const Resource &resource);
+    /// Returns the port.
+    std::uint16_t serve(const Service &service, std::uint16_t port);
+    bool listenOnAll(const Service &service, std::uint16_t &port);
+    void serveVxi11();
+    void servePortmapper();
 
     EventLoop &m_loop;
     const Options m_options;
     Instrument m_instrument;
     HislipServer m_hislip;
     SocketServer m_socket;
+    Vxi11Server m_vxi11;
+    Portmapper m_portmapper;
     std::vector<std::unique_ptr<Listener>> m_listeners;
     std::vector<std::string> m_lines;
+    std::vector<std::string> m_notes;
 };
 
 } // namespace simulator

@@ -127,6 +127,17 @@ void MessageExchange::interrupted()
     m_instrument.publishStatus();
 }
 
+void MessageExchange::unterminated()
+{
+    m_input.clear();
+    m_response.take();
+    m_output.clear();
+    finishMessage();
+    m_available = false;
+    report({-420, {}});
+    m_instrument.publishStatus();
+}
+
 void MessageExchange::clear()
 {
     m_instrument.timers.cancel(std::exchange(m_holdTimer, Timers::None));

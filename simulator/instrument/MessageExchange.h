@@ -71,6 +71,8 @@ public:
     OutputQueue &output() { return m_output; }
     /// The client sent something new before it had read its answer: -410, and the answer is gone.
     void interrupted();
+    /// The client wants to read, and there is nothing that would give it an answer: -420, and a message that has begun is forgotten.
+    void unterminated();
     /// Device clear: exchange and pending waits as after power-on; settings, status and errors stay.
     void clear();
     void trigger();

@@ -2,22 +2,13 @@
 
 #include "simulator/server/EventLoop.h"
 #include "simulator/server/FileDescriptor.h"
+#include "simulator/server/ListenAddress.h"
 
 #include <cstdint>
 #include <functional>
-#include <string>
 
 namespace simulator
 {
-
-/// A numeric IPv4 or IPv6 address to listen on.
-struct ListenAddress {
-    std::string text;      ///< without brackets
-    bool optional = false; ///< not to have it, or not to have this family at all, is no error
-
-    bool isIpv6() const { return text.find(':') != std::string::npos; }
-    bool isLoopback() const;
-};
 
 /// Accepts TCP connections on one address and hands them on, non-blocking.
 class Listener

@@ -28,11 +28,14 @@ std::vector<std::string> addresses(const Options &options)
 
 } // namespace
 
-TEST(SimulatorOptions, ServeHislipAndSocketWhenNothingIsAskedFor)
+TEST(SimulatorOptions, ServeHislipSocketAndVxi11WhenNothingIsAskedFor)
 {
     const Options options = parse({});
     EXPECT_EQ(options.hislip, 4880);
     EXPECT_EQ(options.socket, 5025);
+    EXPECT_EQ(options.vxi11, 0);
+    EXPECT_EQ(options.portmapper, 111);
+    EXPECT_TRUE(options.portmapperIsOptional);
     EXPECT_EQ(options.maxMessage, 1073807360u);
     EXPECT_TRUE(options.reportUnread);
     EXPECT_FALSE(options.quiet);
@@ -44,6 +47,25 @@ TEST(SimulatorOptions, ServeNothingElseThanWhatIsAskedFor)
     const Options options = parse({"--socket", "0"});
     EXPECT_EQ(options.hislip, std::nullopt);
     EXPECT_EQ(options.socket, 0);
+    EXPECT_EQ(options.vxi11, std::nullopt);
+    EXPECT_EQ(options.portmapper, std::nullopt);
+}
+
+TEST(SimulatorOptions, TakeThePortmapperThatIsAskedForAndNoOther)
+{
+    const Options options = parse({"--vxi11", "1024", "--portmapper", "1111"});
+    EXPECT_EQ(options.vxi11, 1024);
+    EXPECT_EQ(options.portmapper, 1111);
+    EXPECT_FALSE(options.portmapperIsOptional) << "asked for: not to have it is an error";
+    EXPECT_EQ(parse({"--portmapper", "0"}).vxi11, std::nullopt);
+}
+
+TEST(SimulatorOptions, AddAPortmapperToVxi11WhereItMayBeHad)
+{
+    const Options options = parse({"--vxi11", "0"});
+    EXPECT_EQ(options.portmapper, 111);
+    EXPECT_TRUE(options.portmapperIsOptional);
+    EXPECT_EQ(options.socket, std::nullopt);
 }
 
 TEST(SimulatorOptions, TakeSeveralAddressesInEitherSpelling)

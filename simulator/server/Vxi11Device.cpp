@@ -1,0 +1,143 @@
+#include "simulator/server/Vxi11Device.h"
+
+#include <utility>
+
+namespace simulator
+{
+
+Vxi11Device::Vxi11Device(Instrument &instrument, Events events)
+    : m_instrument(instrument), m_events(std::move(events)),
+      m_exchange(instrument, *this, {true, false, [this](std::uint8_t) { m_events.serviceRequest(); }})
+{
+}
+
+Vxi11Device::~Vxi11Device()
+{
+    m_instrument.timers.cancel(m_backlogTimer);
+}
+
+void Vxi11Device::write(std::span<const std::byte> bytes, bool end)
+{
+    m_instrument.remote.addressed();
+    if (!m_backlog.empty() || !take(bytes, end))
+        keep(bytes, end);
+}
+
+bool Vxi11Device::takes() const
+{
+    return m_exchange.accepting() && !(m_response.active() && m_events.isAwaited());
+}
+
+/// False when bytes, or the end that follows them, are left over.
+bool Vxi11Device::take(std::span<const std::byte> &bytes, bool end)
+{
+    while (!bytes.empty() && takes()) {
+        messageBegins();
+        m_exchange.receive(bytes);
+        fetchAnswer();
+    }
+    if (!bytes.empty() || (end && !m_exchange.accepting()))
+        return false;
+    if (end) {
+        m_exchange.end();
+        fetchAnswer();
+    }
+    return true;
+}
+
+void Vxi11Device::keep(std::span<const std::byte> bytes, bool end)
+{
+    m_backlog.push_back({{bytes.begin(), bytes.end()}, end});
+    m_backlogSize += sizeof(Input) + bytes.size();
+    takeBacklogLater();
+}
+
+/// Later, so that whoever waits for an answer gets it first.
+void Vxi11Device::takeBacklogLater()
+{
+    if (!m_backlog.empty() && m_exchange.accepting() && m_backlogTimer == Timers::None)
+        m_backlogTimer = m_instrument.timers.after({}, [this] { takeBacklog(); });
+}
+
+void Vxi11Device::takeBacklog()
+{
+    m_backlogTimer = Timers::None;
+    while (!m_backlog.empty()) {
+        const Input input = std::move(m_backlog.front());
+        m_backlog.pop_front();
+        m_backlogSize -= sizeof(Input) + input.bytes.size();
+        std::span<const std::byte> bytes = input.bytes;
+        if (take(bytes, input.end))
+            continue;
+        m_backlog.push_front({{bytes.begin(), bytes.end()}, input.end});
+        m_backlogSize += sizeof(Input) + bytes.size();
+        break;
+    }
+    m_events.changed();
+    takeBacklogLater();
+}
+
+/// The next byte may be the first of a program message: then an answer that was not read to its end is lost.
+void Vxi11Device::messageBegins()
+{
+    if (m_exchange.inMessage() || !m_response.active())
+        return;
+    m_response.drop();
+    m_exchange.interrupted();
+}
+
+void Vxi11Device::fetchAnswer()
+{
+    if (!m_exchange.output().isComplete())
+        return;
+    m_response.begin(m_exchange.output().take());
+    m_exchange.setMessageAvailable(true);
+    m_events.changed();
+}
+
+void Vxi11Device::inputAccepted()
+{
+    fetchAnswer();
+    m_events.changed();
+    takeBacklogLater();
+}
+
+void Vxi11Device::readBegins()
+{
+    m_instrument.remote.addressed();
+    if (!m_response.active() && m_exchange.accepting() && m_backlog.empty())
+        m_exchange.unterminated();
+}
+
+Vxi11Response::Piece Vxi11Device::read(std::size_t most, std::optional<std::uint8_t> termination)
+{
+    Vxi11Response::Piece piece = m_response.take(most, termination);
+    if (piece.last)
+        m_exchange.setMessageAvailable(false);
+    return piece;
+}
+
+void Vxi11Device::trigger()
+{
+    m_instrument.remote.addressed();
+    messageBegins();
+    m_exchange.trigger();
+}
+
+void Vxi11Device::clear()
+{
+    m_instrument.remote.addressed();
+    m_backlog.clear();
+    m_backlogSize = 0;
+    m_response.drop();
+    m_exchange.clear();
+    m_events.changed();
+}
+
+std::uint8_t Vxi11Device::poll()
+{
+    m_instrument.remote.addressed();
+    return m_exchange.poll();
+}
+
+} // namespace simulator
