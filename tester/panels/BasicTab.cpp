@@ -13,6 +13,7 @@
 #include <QPlainTextEdit>
 #include <QPushButton>
 #include <QSignalBlocker>
+#include <QTextOption>
 
 #include <limits>
 
@@ -56,6 +57,8 @@ void BasicTab::setupUi()
     m_statusByte->setTextInteractionFlags(Qt::TextSelectableByMouse);
     m_readView->setReadOnly(true);
     m_readView->setUndoRedoEnabled(false); // otherwise each read would be kept twice
+    // Looking for places to break at takes minutes in half a megabyte that has none.
+    m_readView->setWordWrapMode(QTextOption::WrapAnywhere);
     m_statusByteTimer.setSingleShot(true);
     m_statusByteTimer.setTimerType(Qt::PreciseTimer);
     timeup();

@@ -8,6 +8,7 @@
 #include <visa.h>
 
 #include <QCheckBox>
+#include <QElapsedTimer>
 #include <QLabel>
 #include <QLineEdit>
 #include <QPlainTextEdit>
@@ -168,6 +169,19 @@ TEST_F(BasicTabTest, ShowsInvalidUtf8AsReplacementCharacters)
 {
     finish(data(Kind::Read, "\xC3\xBC\xFF!"));
     EXPECT_EQ(shown(), QString(QChar(0xFC)) + QChar(0xFFFD) + "!");
+}
+
+TEST_F(BasicTabTest, ALongAnswerWithoutABreakDoesNotHoldTheWindow)
+{
+    constexpr int Length = 512 * 1024;
+    m_tab.resize(600, 400);
+    m_tab.show();
+    QElapsedTimer timer;
+    timer.start();
+    finish(data(Kind::Read, std::string(Length, '7')));
+    QCoreApplication::processEvents();
+    EXPECT_LT(timer.elapsed(), 20000) << "it takes less than one second on an idle machine";
+    EXPECT_EQ(shown().size(), Length);
 }
 
 TEST_F(BasicTabTest, TheReadViewCannotBeTypedInto)
