@@ -92,6 +92,8 @@ TEST_F(ResourceFrameInWindow, AnOpenWithInformationConnectsAndTheLabelIsOrange)
     press("resourceConnect");
     ASSERT_TRUE(connected());
     ASSERT_TRUE(gate->waitForArrival());
+    EXPECT_TRUE(eventually([this] { return text("statusLabel") == "Status: VI_WARN_CONFIG_NLOADED"; }));
+    EXPECT_EQ(labelColour().rgb(), QColor::fromHsl(30, 255, 128).rgb());
     gate->open();
     EXPECT_TRUE(eventually([this] { return text("statusLabel") == "Status: VI_SUCCESS"; }));
     EXPECT_EQ(labelColour(), QColor(Qt::blue));
