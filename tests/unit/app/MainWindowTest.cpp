@@ -1,4 +1,5 @@
 #include "app/MainWindow.h"
+#include "pipeline/VisaDispatcher.h"
 #include "support/EventLoop.h"
 #include "support/standin/Standin.h"
 
@@ -86,6 +87,20 @@ TEST_F(MainWindowTest, OpensCentredAt750By480WithThePlainTitle)
     m_gate->open();
 }
 
+TEST_F(MainWindowTest, IsCentredForTheStoredSizeWhileNoPositionIsStored)
+{
+    QSettings().setValue("MainWindow/size", QSize(640, 500));
+    MainWindow window(nullptr);
+    const QRect screen = QGuiApplication::primaryScreen()->geometry();
+    EXPECT_EQ(window.pos(), QPoint((screen.width() - 1) / 2 - 639 / 2, (screen.height() - 1) / 2 - 499 / 2));
+}
+
+TEST_F(MainWindowTest, OwnsTheDispatcher)
+{
+    const MainWindow window(nullptr);
+    EXPECT_EQ(VisaDispatcher::getVisaDispatcherInstance(nullptr)->parent(), &window);
+}
+
 TEST_F(MainWindowTest, NamesTheVisaImplementationInItsTitle)
 {
     MainWindow window(nullptr);
@@ -153,6 +168,19 @@ TEST_F(MainWindowTest, AnotherAttributeThatComesFirstEndsTheTitle)
     m_gate->open();
 }
 
+TEST_F(MainWindowTest, ARefusedRequestEndsTheTitle)
+{
+    holdAnswers();
+    MainWindow window(nullptr);
+    ASSERT_TRUE(m_gate->waitForArrival());
+    for (int i = 0; i < 342; ++i) // with the first three, more requests than the ring has room for
+        window.updateTitle();
+    deliver(window, attribute(0xBFFF0174, 0, "Acme"));
+    deliver(window, attribute(0x3FFF0175, 1));
+    EXPECT_EQ(window.windowTitle(), PlainTitle);
+    m_gate->open();
+}
+
 TEST_F(MainWindowTest, OtherSuccessfulCallsLeaveTheTitlePending)
 {
     holdAnswers();
@@ -181,6 +209,15 @@ TEST_F(MainWindowTest, SaysWhatRunsAndWhatFinished)
     deliver(window, finished(VisaFunctionCallTyp::Read, VI_ERROR_TMO));
     EXPECT_EQ(window.statusBar()->currentMessage(), "Function finished");
     EXPECT_TRUE(QTest::qWaitFor([&window] { return window.statusBar()->currentMessage().isEmpty(); }, 30000));
+}
+
+TEST_F(MainWindowTest, MessagesLeaveTheStatusLabelInPlace)
+{
+    MainWindow window(nullptr);
+    window.show();
+    deliver(window, finished(VisaFunctionCallTyp::Read));
+    ASSERT_EQ(window.statusBar()->currentMessage(), "Function finished");
+    EXPECT_TRUE(window.findChild<QLabel *>("statusLabel")->isVisible());
 }
 
 TEST_F(MainWindowTest, OffersFourToolsInOrder)

@@ -11,8 +11,10 @@
 #include <QBoxLayout>
 #include <QCheckBox>
 #include <QDir>
+#include <QElapsedTimer>
 #include <QFile>
 #include <QFileInfo>
+#include <QKeyEvent>
 #include <QLineEdit>
 #include <QPlainTextEdit>
 #include <QPushButton>
@@ -174,6 +176,28 @@ TEST_F(SessionTab, WriteLogSwitchesTheLogFile)
     EXPECT_FALSE(written().contains("viOpen("));
 }
 
+TEST_F(SessionTab, LogSwitchesTakeEffectThroughTheEventLoop)
+{
+    m_tab->resize(900, 600);
+    m_tab->show();
+    connectTo("GPIB0::5::INSTR");
+    ASSERT_TRUE(processEventsUntil([] { return standin::calls("viSetAttribute").size() == 1; }));
+    find<QCheckBox>("showLog")->setChecked(false);
+    _visaFunctionCall call;
+    call.type = VisaFunctionCallTyp::ReadSTB;
+    for (int i = 0; i < 2; ++i) // the second call begins after the first one's line was emitted
+        ASSERT_TRUE(m_tab->getVisaFunctionCallHandler()->sendVisaFunctionCall(call, false));
+    ASSERT_TRUE(standin::waitForCalls("viReadSTB", 2));
+    auto *table = find<QTableWidget>("logTable");
+    EXPECT_TRUE(processEventsUntil([table] { return !table->findItems("viReadSTB(", Qt::MatchStartsWith).isEmpty(); }));
+}
+
+TEST_F(SessionTab, ItsItemsHaveTheIdentifiersTwoAndThree)
+{
+    EXPECT_TRUE(*m_tab->getResourceName() == ResourceName(2));
+    EXPECT_TRUE(static_cast<Data &>(*m_tab->getLogFile()) == ResourceName(3));
+}
+
 TEST_F(SessionTab, AFirstRunWritesTheThreeItems)
 {
     const QByteArray folder = m_tab->getLogFile()->getCurrentStandardDir().toLocal8Bit();
@@ -232,7 +256,9 @@ TEST_F(SessionTab, PassesKeysToTheBasicPageOnlyWhileThatIsShown)
     auto *pages = find<QTabWidget>("sessionPages");
     pages->addTab(&other, "Other");
     pages->setCurrentWidget(&other);
-    QTest::keyClick(m_tab, Qt::Key_R, Qt::ControlModifier);
+    QKeyEvent dropped(QEvent::KeyPress, Qt::Key_R, Qt::ControlModifier);
+    QCoreApplication::sendEvent(m_tab, &dropped);
+    EXPECT_TRUE(dropped.isAccepted()) << "not even passed on to the window";
     pages->setCurrentIndex(0);
     pages->removeTab(1);
     QTest::keyClick(m_tab, Qt::Key_W, Qt::ControlModifier);
@@ -253,6 +279,8 @@ TEST_F(SessionTab, EndsTheProcessWithStatus55WhenTheWorkerIsStuckAfterSavingTheS
     end();
     QFile::remove(m_dataFile);
     testing::FLAGS_gtest_death_test_style = "threadsafe";
+    QElapsedTimer timer;
+    timer.start();
     EXPECT_EXIT(
         {
             QObject parent;
@@ -265,6 +293,7 @@ TEST_F(SessionTab, EndsTheProcessWithStatus55WhenTheWorkerIsStuckAfterSavingTheS
                 delete tab;
         },
         testing::ExitedWithCode(55), "");
+    EXPECT_GE(timer.elapsed(), 4000) << "the worker was given its time";
     EXPECT_EQ(data().left(24), "000001000012ASRL1::INSTR");
 }
 } // namespace

@@ -270,6 +270,16 @@ TEST_F(CommandLineKeys, DownLeadsToTheCommandBeforeTheOneJustSent)
     EXPECT_EQ(m_line.currentText(), "older");
 }
 
+TEST(CommandHistory, IsTheItemWithIdentifierFour)
+{
+    struct Four final : Data {
+        Four() : Data(4) {}
+        QByteArray getData() override { return {}; }
+        void setData(const QByteArray &) override {}
+    };
+    EXPECT_TRUE(ScipiLineEdit(nullptr) == Four());
+}
+
 TEST(CommandHistory, IsSavedOneItemALine)
 {
     ScipiLineEdit line(nullptr);

@@ -13,6 +13,7 @@
 #include <QLabel>
 #include <QRadioButton>
 #include <QTest>
+#include <QVBoxLayout>
 #include <QValidator>
 
 #include <gtest/gtest.h>
@@ -314,6 +315,17 @@ TEST(MechanismFrame, StartsWithQueue)
     EXPECT_EQ(frame.findChild<QLabel *>("mechanismLabel")->text(), "Mechanism");
     EXPECT_EQ(frame.findChild<QRadioButton *>("mechanismQueue")->text(), "Queue");
     EXPECT_EQ(frame.findChild<QRadioButton *>("mechanismHandler")->text(), "Handler");
+}
+
+TEST(MechanismFrame, ShowsItsLabelAboveQueueAboveHandler)
+{
+    MechanismFrame frame(nullptr);
+    auto *column = qobject_cast<QVBoxLayout *>(frame.layout());
+    ASSERT_TRUE(column);
+    ASSERT_EQ(column->count(), 3);
+    EXPECT_EQ(column->itemAt(0)->widget()->objectName(), "mechanismLabel");
+    EXPECT_EQ(column->itemAt(1)->widget()->objectName(), "mechanismQueue");
+    EXPECT_EQ(column->itemAt(2)->widget()->objectName(), "mechanismHandler");
 }
 
 TEST(MechanismFrame, WritesTheHandlerMechanismInto16Bits)

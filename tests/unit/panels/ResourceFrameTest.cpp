@@ -54,6 +54,29 @@ TEST_F(ResourceFrameTest, StartsDisconnectedWithItsDefaults)
     EXPECT_FALSE(find<QCheckBox>(m_frame, "writeLog")->isChecked());
 }
 
+TEST_F(ResourceFrameTest, LiesInOneRow)
+{
+    const auto place = [this](const char *name) { return find<QWidget>(m_frame, name)->geometry(); };
+    m_frame.resize(900, 200);
+    m_frame.show();
+    QCoreApplication::processEvents();
+    EXPECT_LT(place("resourceLabel").bottom(), place("resourceName").top());
+    EXPECT_LT(place("resourceName").right(), place("resourceConnect").left());
+    EXPECT_LT(place("resourceConnect").right(), place("openExclusiveLock").left());
+    EXPECT_LT(place("openExclusiveLock").bottom(), place("openLoadConfig").top());
+    EXPECT_LT(place("openExclusiveLock").right(), place("openTimeout").left());
+    EXPECT_LT(place("openTimeoutLabel").bottom(), place("openTimeout").top());
+    EXPECT_LT(place("openTimeout").right(), place("showLog").left());
+    EXPECT_LT(place("showLog").bottom(), place("writeLog").top());
+    EXPECT_GT(place("resourceConnect").bottom(), 150);
+    EXPECT_EQ(place("resourceConnect").bottom(), place("openTimeout").bottom());
+
+    const QRect connect = place("resourceConnect");
+    finish(result(Kind::Open));
+    QCoreApplication::processEvents();
+    EXPECT_EQ(place("resourceDisconnect"), connect);
+}
+
 TEST_F(ResourceFrameTest, ConnectSendsNameAccessModeAndTimeout)
 {
     m_line->setText("TCPIP::localhost::hislip0");

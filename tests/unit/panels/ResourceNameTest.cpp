@@ -38,6 +38,30 @@ TEST(Subject, RemovesOneRegistrationAtATime)
     EXPECT_EQ(observer.names, QStringList({"", "", "a", "a", "b"}));
 }
 
+/// Writes its own name down.
+struct NamedObserver final : Observer {
+    NamedObserver(const char *itsName, QStringList *itsTold) : name(itsName), told(itsTold) {}
+    void update(Subject *) override { *told << name; }
+    QString name;
+    QStringList *told;
+};
+
+TEST(Subject, TellsObserversInTheirOrderAndRemovesTheFirstOccurrence)
+{
+    QStringList told;
+    NamedObserver a("a", &told), b("b", &told), c("c", &told);
+    ResourceName name(2);
+    for (NamedObserver *observer : {&a, &b, &a, &c})
+        name.addObserver(observer);
+    told.clear();
+    name.setName("x");
+    EXPECT_EQ(told, QStringList({"a", "b", "a", "c"}));
+    told.clear();
+    name.removeObserver(&a);
+    name.setName("y");
+    EXPECT_EQ(told, QStringList({"b", "a", "c"}));
+}
+
 TEST(ResourceName, AnObserverMayAskForTheNameWhileItIsNotified)
 {
     ResourceName name(2);
