@@ -50,6 +50,7 @@ Snapshot copyOf(const std::list<_VisaFunctionCallHandlerListener *> &listeners, 
         snapshot.append(listener);
     return snapshot;
 }
+
 /// A result that does not fit into memory once more is delivered as a failure without texts, rather than not at all.
 void copyResult(const _visaFunctionCall &from, _visaFunctionCall &to)
 {
@@ -113,8 +114,8 @@ bool VisaFunctionCallHandler::getVisaFunctionCall(_visaFunctionCall &call)
     if (m_closed.load(std::memory_order_acquire))
         return false;
 
+    m_callCount.load(std::memory_order_acquire); // pairs with the increment that published the slot
     // A slot that was taken keeps no memory: a thousand large writes would stay for ever.
-    m_callCount.load(std::memory_order_acquire);
     call = std::exchange(m_calls[m_callRead], {});
     m_callRead = (m_callRead + 1) % RequestCapacity;
     m_callCount.fetch_sub(1, std::memory_order_release);
