@@ -129,6 +129,25 @@ TEST_F(CallCreator, SendsLockingRequestsUnlessToldOtherwise)
     EXPECT_EQ(m_label.started.size(), 3u);
 }
 
+TEST_F(CallCreator, SendsToTheHandlerItIsGivenLater)
+{
+    Creator creator(nullptr);
+    creator.setType(VisaFunctionCallTyp::Read);
+    creator.setVisaFunctionCallHandler(m_handler.get());
+    EXPECT_TRUE(creator.sendFunctionCall());
+    EXPECT_EQ(take().type, VisaFunctionCallTyp::Read);
+
+    auto other = std::make_unique<VisaFunctionCallHandler>(nullptr);
+    creator.setVisaFunctionCallHandler(other.get());
+    EXPECT_TRUE(creator.sendFunctionCall());
+    _visaFunctionCall call;
+    EXPECT_TRUE(other->getVisaFunctionCall(call));
+    EXPECT_EQ(m_label.started.size(), 1u);
+
+    other.reset(); // tells the creator, which would otherwise send to what is gone
+    EXPECT_TRUE(creator.sendFunctionCall());
+}
+
 TEST(CallParameterValue, ClearKeepsTheNumber)
 {
     Parameter start{7, std::string("a\0b", 3)};

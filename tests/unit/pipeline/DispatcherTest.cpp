@@ -262,6 +262,20 @@ TEST_F(Dispatcher, AWakeUpForASecondHandlerIsDroppedWhileTheFirstOnesIsOnItsWay)
     EXPECT_EQ(second.finished.size(), 2u);
 }
 
+TEST_F(Dispatcher, AProducerThatWaitsForRoomAsksUntilADeliveryComes)
+{
+    const auto other = std::make_unique<VisaFunctionCallHandler>(m_dispatcher);
+    RecordingListener first(m_handler.get(), VisaFunctionCallTyp::Read);
+    RecordingListener second(other.get(), VisaFunctionCallTyp::Read);
+    finish(VisaFunctionCallTyp::Read);
+    for (unsigned i = 0; i < 4096; ++i)
+        finish(*other, VisaFunctionCallTyp::Read); // all these wishes are dropped
+    std::thread worker([&] { finish(*other, VisaFunctionCallTyp::Read); });
+    EXPECT_TRUE(processEventsUntil([&] { return second.finished.size() == 4097; }));
+    other->close();
+    worker.join();
+}
+
 TEST_F(Dispatcher, SkipsWhatIsRegisteredButReceivesNothing)
 {
     class Creator final : public VisaFunctionCallCreator

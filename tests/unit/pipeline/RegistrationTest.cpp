@@ -69,7 +69,7 @@ TEST_F(Registration, TheKindGivenWithoutAHandlerCountsOnceThereIsOne)
     EXPECT_EQ(copies(VisaFunctionCallTyp::Open), 1u);
 }
 
-TEST_F(Registration, AKindThatWasRefusedAtConstructionIsNotRecorded)
+TEST_F(Registration, AKindThatWasRefusedAtConstructionHindersNoOther)
 {
     RecordingListener listener(m_handler.get(), VisaFunctionCallTyp::End);
     EXPECT_TRUE(listener.listenToType(VisaFunctionCallTyp::Open));

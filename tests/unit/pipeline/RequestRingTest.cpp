@@ -7,9 +7,12 @@
 
 #include <unistd.h>
 
+#include <atomic>
+#include <chrono>
 #include <future>
 #include <memory>
 #include <thread>
+#include <vector>
 
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -176,6 +179,36 @@ TEST_F(RequestRing, ClosingWakesATakerAndEndsTaking)
     _visaFunctionCall call;
     for (int i = 0; i < 250; ++i)
         ASSERT_FALSE(m_handler->getVisaFunctionCall(call));
+}
+
+TEST_F(RequestRing, ClosingWakesAHundredTakers)
+{
+    std::atomic<int> awake{0};
+    std::vector<std::promise<pid_t>> started(100);
+    std::vector<std::thread> takers;
+    takers.reserve(started.size());
+    for (auto &start : started) {
+        takers.emplace_back([&] {
+            start.set_value(gettid());
+            _visaFunctionCall call;
+            m_handler->getVisaFunctionCall(call);
+            ++awake;
+        });
+    }
+    for (auto &start : started) {
+        const pid_t taker = start.get_future().get();
+        while (!isAsleep(taker))
+            std::this_thread::yield();
+    }
+    m_handler->close();
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    while (awake < 100 && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::yield();
+    EXPECT_EQ(awake, 100);
+    while (awake < 100) // so that a failure ends
+        m_handler->close();
+    for (std::thread &taker : takers)
+        taker.join();
 }
 
 TEST_F(RequestRing, RequestsQueuedBeforeClosingAreNotTaken)

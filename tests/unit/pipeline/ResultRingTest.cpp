@@ -126,6 +126,26 @@ TEST_F(ResultRing, AProducerWaitsForRoomAfter4096Results)
     EXPECT_TRUE(done);
 }
 
+TEST_F(ResultRing, ALockSetWhileAProducerWaitsForRoomEndsWithItsResult)
+{
+    RecordingListener listener(m_handler.get(), VisaFunctionCallTyp::Read);
+    for (unsigned i = 0; i < 4096; ++i)
+        finish(VisaFunctionCallTyp::Read, i);
+    const auto request = makeCall(VisaFunctionCallTyp::Read);
+    ASSERT_TRUE(m_handler->sendVisaFunctionCall(request, true));
+    std::thread worker([&] { finish(VisaFunctionCallTyp::Read); });
+    // The producer ends the lock before it waits, so that a request can set it once more.
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    bool sent = false;
+    while (!(sent = m_handler->sendVisaFunctionCall(request, true)) && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::yield();
+    EXPECT_TRUE(sent);
+    finsihedFunctionCall record;
+    EXPECT_TRUE(m_handler->getFinishedVisaFunctionCall(record));
+    worker.join();
+    EXPECT_TRUE(m_handler->sendVisaFunctionCall(request, true));
+}
+
 TEST_F(ResultRing, AProducerThatWaitsForRoomGivesUpWhenTheHandlerIsClosed)
 {
     RecordingListener listener(m_handler.get(), VisaFunctionCallTyp::Read);

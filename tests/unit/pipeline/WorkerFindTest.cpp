@@ -58,6 +58,18 @@ TEST_F(WorkerFind, ASearchThatFindsOneResourceLeavesItsListOpen)
     EXPECT_THAT(standin::calls("viClose"), IsEmpty());
 }
 
+TEST_F(WorkerFind, ALibraryThatFindsMoreThanItCountedKeepsItsList)
+{
+    standin::addResource({.name = "TCPIP::1::INSTR"});
+    run(VisaFunctionCallTyp::FindRsrc, text("?*"));
+    standin::script("viFindNext", {.status = VI_SUCCESS, .bytes = "TCPIP::2::INSTR"});
+    const auto extra = run(VisaFunctionCallTyp::FindNext);
+    EXPECT_EQ(extra.status, 0);
+    EXPECT_EQ(extra.parameter[0].stringValue, "TCPIP::2::INSTR");
+    EXPECT_EQ(extra.parameter[1].uintValue, 0u);
+    EXPECT_THAT(standin::calls("viClose"), IsEmpty());
+}
+
 TEST_F(WorkerFind, ListsDoNotPileUpFromSearchToSearch)
 {
     standin::addResource({.name = "TCPIP::1::INSTR"});

@@ -2,6 +2,7 @@
 
 #include <gmock/gmock.h>
 
+#include <QDir>
 #include <QFile>
 
 using testing::ElementsAre;
@@ -32,6 +33,18 @@ TEST_F(WorkerLife, TheThreadEndsWhenTheHandlerIsClosedAndQueuedRequestsAreNotExe
     EXPECT_TRUE(m_thread.wait(20000));
     EXPECT_EQ(standin::calls("viClear").size(), 1u);
     EXPECT_EQ(m_handler->finishedCount(), 0u) << "the call under way has nobody to tell any more";
+}
+
+TEST_F(WorkerLife, TheThreadThatWritesTheLogFileEndsWithTheLoop)
+{
+    const auto threads = [] { return QDir(QStringLiteral("/proc/self/task")).entryList(QDir::Dirs).size(); };
+    const auto before = threads();
+    m_handler->close();
+    ASSERT_TRUE(m_thread.wait(20000));
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    while (threads() > before - 2 && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::yield();
+    EXPECT_LE(threads(), before - 2) << "the loop's thread and the writer's, long before the worker itself goes";
 }
 
 TEST_F(WorkerLife, LinesGoToTheLogFileOnAThreadOfTheirOwn)
