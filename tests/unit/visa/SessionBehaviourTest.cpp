@@ -278,6 +278,13 @@ TEST_F(Session, AsksTheManagerForAttributesWhileNoSessionIsOpen)
     EXPECT_EQ(standin::calls("viGetAttribute").at(0).handle, 1u);
 }
 
+TEST_F(Session, SetsTheTimeOutOfASessionAndNeverTheManagers)
+{
+    m_session->closeSession();
+    EXPECT_EQ(thrownBy([&] { m_session->setTimeout(1000); }), VI_ERROR_INV_OBJECT);
+    EXPECT_EQ(lastText(), "viSetAttribute(vi= 0,type= VI_ATTR_TMO_VALUE,value= 0x3E8)");
+}
+
 TEST_F(Session, ReadsNarrowAttributesWithoutLeftovers)
 {
     Attribute attribute{.id = VI_ATTR_TERMCHAR, .value = 0xFFFFFFFFFFFFFFFF};
