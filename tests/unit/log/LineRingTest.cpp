@@ -3,9 +3,32 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <dlfcn.h>
+#include <pthread.h>
+
+#include <atomic>
+#include <cerrno>
 #include <memory>
+#include <system_error>
 #include <thread>
 #include <vector>
+
+namespace
+{
+thread_local const pthread_mutex_t *lastLocked = nullptr; // by this thread
+thread_local int lockError = 0;                           // answered instead of locking when it is not 0
+} // namespace
+
+/// Notes which mutex this thread locks, or refuses to lock it.
+extern "C" int pthread_mutex_lock(pthread_mutex_t *mutex) noexcept
+{
+    using Lock = int (*)(pthread_mutex_t *);
+    static std::atomic<Lock> original{nullptr};
+    if (!original)
+        original = reinterpret_cast<Lock>(dlsym(RTLD_NEXT, "pthread_mutex_lock"));
+    lastLocked = mutex;
+    return lockError != 0 ? lockError : original.load()(mutex);
+}
 
 namespace
 {
@@ -158,6 +181,43 @@ TEST_F(LineRing, IgnoresNullPointers)
     EXPECT_EQ(m_ring->getLines(), 0u);
     add(1, 1);
     EXPECT_EQ(m_ring->copyFromQueue(nullptr, 1), 0u);
+}
+
+TEST_F(LineRing, SharesOneMutexWithAllOtherRings)
+{
+    const auto other = std::make_unique<StringMessageQueue>();
+    FastBuffer line{};
+    m_ring->addMessage(&line);
+    const pthread_mutex_t *const mine = lastLocked;
+    ASSERT_NE(mine, nullptr);
+    for (int operation = 0; operation < 3; ++operation) {
+        lastLocked = nullptr;
+        if (operation == 0)
+            other->addMessage(&line);
+        else if (operation == 1)
+            other->copyFromQueue(&line, 1);
+        else
+            other->clear();
+        EXPECT_EQ(lastLocked, mine) << operation;
+    }
+    lastLocked = nullptr;
+    EXPECT_EQ(other->getLines(), 1u);
+    EXPECT_EQ(lastLocked, nullptr) << "the total is read without it";
+}
+
+TEST_F(LineRing, ThrowsTheErrorOfALockThatFails)
+{
+    FastBuffer line{};
+    int thrown = 0;
+    lockError = EDEADLK;
+    try {
+        m_ring->addMessage(&line);
+    } catch (const std::system_error &error) {
+        thrown = error.code().value();
+    }
+    lockError = 0;
+    EXPECT_EQ(thrown, EDEADLK);
+    EXPECT_EQ(m_ring->getLines(), 0u);
 }
 
 TEST_F(LineRing, NeverShowsAHalfWrittenLine)

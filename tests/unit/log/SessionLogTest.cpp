@@ -134,6 +134,20 @@ TEST_F(SessionLogTest, MarksVisaLinesAndFreeText)
     }
 }
 
+TEST_F(SessionLogTest, NumbersALineBeforeItGoesAnywhere)
+{
+    m_session.showLog(true);
+    m_session.writeLogFile(true);
+    const std::uint64_t before = Log::s_line;
+    m_session.emitWriteMessage(&m_line);
+    m_session.forceEmitWriteMessage(&m_line);
+    for (const std::vector<FastBuffer> &lines : {shown(), forFile()}) {
+        ASSERT_EQ(lines.size(), 2u);
+        EXPECT_EQ(lines[0].line, before + 1);
+        EXPECT_EQ(lines[1].line, before + 2);
+    }
+}
+
 TEST_F(SessionLogTest, TakesANumberAlsoWhenNobodyListens)
 {
     const std::uint64_t before = Log::s_line;
