@@ -75,6 +75,7 @@ LogTextDisplay::LogTextDisplay(VisaFunctionCallHandler *handler, QWidget *parent
       m_warningColor(QColor::fromHsl(30, 255, 128, 255))
 {
     setupUi();
+    m_timer.setObjectName(QStringLiteral("logTimer"));
     m_timer.setInterval(RefreshInterval);
     connect(&m_timer, &QTimer::timeout, this, &LogTextDisplay::timeout);
     connect(m_clear, &QPushButton::clicked, this, &LogTextDisplay::buttonClearClicked);

@@ -66,7 +66,7 @@ private:
     std::array<FastBuffer, SnapshotSize> m_snapshot; ///< lines of the last look, oldest first
     int m_snapshotCount = 0;
     StringMessageQueue *m_queue = nullptr;
-    QTimer m_timer;
+    QTimer m_timer{this};
     std::uint64_t m_lastTotal = 0; ///< the ring's total at the last look; 0 makes the next look redraw
     int m_rowHeight = 1;
     QColor m_warningColor;

@@ -169,6 +169,16 @@ TEST_F(LogView, StartsInLiveModeAndShowsLinesByItself)
     EXPECT_TRUE(QTest::qWaitFor([&] { return table()->rowCount() == 7; }, 20000));
 }
 
+TEST_F(LogView, LooksEvery300Milliseconds)
+{
+    const auto *timer = m_view->findChild<QTimer *>("logTimer");
+    ASSERT_NE(timer, nullptr);
+    EXPECT_TRUE(timer->isActive());
+    EXPECT_EQ(timer->interval(), 300);
+    LogTextDisplay idle(nullptr, nullptr);
+    EXPECT_FALSE(idle.findChild<QTimer *>("logTimer")->isActive()) << "there is no ring to look at yet";
+}
+
 TEST_F(LogView, ShowsFewLinesFromTheTop)
 {
     add(1, 5);
@@ -378,6 +388,18 @@ TEST_F(LogView, ClearsInViewModeAndStaysThere)
     EXPECT_EQ(label("logDisplayed"), "0");
     FastBuffer line;
     EXPECT_EQ(m_ring->copyFromQueue(&line, 1), 0u);
+}
+
+TEST_F(LogView, BringsNothingBackThatWasCleared)
+{
+    add(1, 30);
+    m_view->timeout();
+    click("logClear");
+    fitRows(25);
+    EXPECT_EQ(table()->rowCount(), 0);
+    click("logViewMode");
+    EXPECT_EQ(table()->rowCount(), 0);
+    EXPECT_EQ(label("logDisplayed"), "0");
 }
 
 TEST_F(LogView, FitsItsRowsToTheHeightInLiveMode)
