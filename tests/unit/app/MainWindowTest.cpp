@@ -1,6 +1,7 @@
 #include "app/MainWindow.h"
 #include "pipeline/VisaDispatcher.h"
 #include "support/EventLoop.h"
+#include "support/StartedProgram.h"
 #include "support/standin/Standin.h"
 
 #include <visa.h>
@@ -229,6 +230,16 @@ TEST_F(MainWindowTest, OffersFourToolsInOrder)
     for (const QAction *action : bar->actions())
         texts << action->text();
     EXPECT_EQ(texts, QStringList({"Find Resource", "Logging", "KyVisa Config", "KyVisa TraceTool"}));
+}
+
+TEST_F(MainWindowTest, ToolsStartTheirProgramsWithoutArguments)
+{
+    MainWindow window(nullptr);
+    const StartedProgram started;
+    QTest::mouseClick(window.findChild<QWidget *>("actionKyVisaConfigButton"), Qt::LeftButton);
+    EXPECT_EQ(started.commandLine(), "/usr/bin/KyVisaConfigure");
+    QTest::mouseClick(window.findChild<QWidget *>("actionKyVisaTraceToolButton"), Qt::LeftButton);
+    EXPECT_EQ(started.commandLine(), "/usr/bin/KyVisaTraceTool");
 }
 
 TEST_F(MainWindowTest, AToolThatIsNotInstalledIsPassedOverInSilence)
