@@ -15,12 +15,14 @@
 #include <QSignalBlocker>
 #include <QTextOption>
 
+#include <algorithm>
 #include <limits>
 
 namespace
 {
 constexpr int StatusByteFreshMs = 4000;
-constexpr int CommandCharacters = 20; ///< of the line's least width; long history items must not widen the page
+constexpr int MostCharacters = 16 << 20; ///< in the read view; Qt itself ends the program at about a thousand million
+constexpr int CommandCharacters = 20;    ///< of the line's least width; long history items must not widen the page
 } // namespace
 
 BasicTab::BasicTab(VisaFunctionCallHandler *handler, QWidget *parent)
@@ -186,13 +188,19 @@ void BasicTab::visaFunctionCallFinished(_visaFunctionCall &call)
     }
 }
 
-/// Inserts instead of setting the whole text anew: the text is the same, and a long session of reads stays fast.
+/// Inserts instead of setting the whole text anew: the text is the same, and a long session of reads stays fast. What is
+/// longer than the view holds is cut; a view that would overflow begins anew.
 void BasicTab::appendToReadView(const std::string &bytes)
 {
+    const auto length = std::min(bytes.size(), static_cast<std::size_t>(MostCharacters));
+    const QString text = QString::fromUtf8(bytes.data(), static_cast<int>(length));
+    const int shown = m_readView->document()->characterCount() - 1; // an empty document counts one
+    if (shown > MostCharacters - text.size())
+        m_readView->clear();
     QTextCursor end(m_readView->document());
     end.movePosition(QTextCursor::End);
     const int start = end.position();
-    end.insertText(QString::fromStdString(bytes));
+    end.insertText(text);
     end.setPosition(start);
     m_readView->setTextCursor(end); // scrolls to where the new data begins
 }

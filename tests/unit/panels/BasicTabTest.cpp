@@ -184,6 +184,32 @@ TEST_F(BasicTabTest, ALongAnswerWithoutABreakDoesNotHoldTheWindow)
     EXPECT_EQ(shown().size(), Length);
 }
 
+/// So many characters in lines.
+std::string lines(std::size_t characters)
+{
+    std::string text(characters, '7');
+    for (std::size_t end = 79; end < text.size(); end += 80)
+        text[end] = '\n';
+    return text;
+}
+
+TEST_F(BasicTabTest, OfAnAnswerLongerThanTheReadViewHoldsTheBeginningIsShown)
+{
+    _visaFunctionCall call = data(Kind::Read, lines((16 << 20) + 5));
+    m_tab.visaFunctionCallFinished(call);
+    EXPECT_EQ(shown().size(), 16 << 20);
+}
+
+TEST_F(BasicTabTest, AFullReadViewBeginsAnew)
+{
+    _visaFunctionCall call = data(Kind::Read, lines(15 << 20));
+    m_tab.visaFunctionCallFinished(call);
+    finish(data(Kind::Read, lines(1 << 20)));
+    EXPECT_EQ(shown().size(), 16 << 20);
+    finish(data(Kind::Read, "new"));
+    EXPECT_EQ(shown(), "new");
+}
+
 TEST_F(BasicTabTest, TheReadViewCannotBeTypedInto)
 {
     finish(data(Kind::Read, "one"));
