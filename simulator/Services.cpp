@@ -5,6 +5,7 @@
 
 #include <sys/socket.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <ostream>
 #include <stdexcept>
@@ -22,6 +23,8 @@ InstrumentOptions instrumentOptions(const Options &options)
     InstrumentOptions result;
     result.version = KYVISA_VERSION;
     result.maxMessage = options.maxMessage;
+    // The largest block that can be sent can be stored.
+    result.massMemory = std::max<std::uint64_t>(result.massMemory, options.maxMessage);
     return result;
 }
 
