@@ -6,6 +6,7 @@
 #include <rapidcheck/gtest.h>
 
 #include <algorithm>
+#include <ostream>
 
 using namespace wire::hislip;
 
@@ -17,6 +18,12 @@ struct Row {
     const char *bytes; ///< 'H' 'S' type control | parameter | payload length
     Header header;
 };
+
+/// In place of its bytes, in which addresses differ from run to run.
+void PrintTo(const Row &row, std::ostream *out)
+{
+    *out << row.bytes;
+}
 
 // One line a message of IVI-6.1, with the fields that it uses set.
 const Row Rows[] = {

@@ -172,6 +172,26 @@ TEST_F(HislipServer, ReportsAnUnreadResponseInTheInstrumentAlone)
     EXPECT_TRUE(client.async.silentFor(50ms));
 }
 
+namespace
+{
+
+class HislipServerThatIgnoresUnread : public SimulatorFixture
+{
+protected:
+    HislipServerThatIgnoresUnread() : SimulatorFixture({"--hislip", "0", "--socket", "0", "--hislip-ignore-unread"}) {}
+};
+
+} // namespace
+
+TEST_F(HislipServerThatIgnoresUnread, TakesItThatTheClientNeverSaysWhatItHasRead)
+{
+    HislipClient client(simulator.port("hislip"));
+    client.sync.send(message("4853 07 00 FFFFFF00", "*CLS;*IDN?\n"));
+    expectMessage(client.sync, "4853 07 00 FFFFFF00", Identification);
+    client.sync.send(message("4853 07 00 FFFFFF02", "SYST:ERR?;*ESR?\n"));
+    expectMessage(client.sync, "4853 07 00 FFFFFF02", "0,\"No error\";0\n");
+}
+
 TEST_F(HislipServer, ReportsNothingWhenAStatusQueryDeliveredTheResponse)
 {
     client.sync.send(message("4853 07 00 FFFFFF00", "*CLS;*IDN?\n"));

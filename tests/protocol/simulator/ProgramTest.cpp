@@ -24,11 +24,12 @@ struct Outcome {
     std::string error;
 };
 
-/// Runs the program until it ends by itself.
-Outcome run(const std::string &options)
+/// Runs the program until it ends by itself, or is asked to after so many seconds.
+Outcome run(const std::string &options, int seconds = 60)
 {
     const std::string errors = testing::TempDir() + "kyvisa-simulator-" + std::to_string(::getpid()) + ".err";
-    const std::string command = std::string("timeout 60 ") + SIMULATOR_FILE + " " + options + " 2>" + errors;
+    const std::string command =
+        "timeout --preserve-status " + std::to_string(seconds) + " " + SIMULATOR_FILE + " " + options + " 2>" + errors;
     FILE *out = ::popen(command.c_str(), "r");
     Outcome result;
     char piece[4096];
@@ -103,6 +104,14 @@ TEST(SimulatorProgram, PrintsHelpAndVersion)
     for (const char *option : {"--listen ADDRESS", "--hislip PORT", "--socket PORT", "--max-message BYTES", "--quiet",
                                "--help", "--version"})
         EXPECT_NE(help.out.find(option), std::string::npos) << option << " in:\n" << help.out;
+}
+
+TEST(SimulatorProgram, SaysNothingWhenQuiet)
+{
+    const Outcome result = run("--quiet --hislip 0 --socket 0", 1);
+    EXPECT_EQ(result.status, 0);
+    EXPECT_EQ(result.out, "");
+    EXPECT_EQ(result.error, "");
 }
 
 TEST(SimulatorProgram, NamesABadOption)

@@ -74,6 +74,12 @@ struct Row {
     std::vector<Unit> units;
 };
 
+/// In place of its bytes, in which addresses differ from run to run.
+void PrintTo(const Row &row, std::ostream *out)
+{
+    *out << row.name;
+}
+
 const Row Rows[] = {
     {"LineFeedEnds", "*IDN?\n", false, {{"*IDN?", {}, true}}},
     {"EndAloneEnds", "*IDN?", true, {{"*IDN?", {}, true}}},
