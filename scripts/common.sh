@@ -27,7 +27,8 @@ need_packages() {
     exit 1
   fi
   local installed
-  installed=$(dpkg-query -W -f '${db:Status-Status} ${Package}\n' "${wanted[@]}" 2>/dev/null | awk '$1 == "installed" {print $2}')
+  # dpkg-query fails when it does not know one of them; what it does know is all that counts.
+  installed=$({ dpkg-query -W -f '${db:Status-Status} ${Package}\n' "${wanted[@]}" 2>/dev/null || true; } | awk '$1 == "installed" {print $2}')
   for name in "${wanted[@]}"; do
     grep -qx -- "$name" <<<"$installed" || missing+=("$name")
   done
