@@ -51,11 +51,16 @@ need_packages() {
   rm -f "$log"
 }
 
-# Configures (once) and builds a preset; further arguments are targets.
+# Configures and builds a preset; further arguments are targets. The tests need packages that the programs do not: with
+# targets given, a folder that is new is configured without them.
 build_preset() {
   local preset=$1 folder
   shift
   case $preset in default) folder=build ;; *) folder=build/$preset ;; esac
-  [ -e "$folder/build.ninja" ] || cmake --preset "$preset" >/dev/null
+  if [ $# -eq 0 ]; then
+    case $preset in default) cmake --preset "$preset" -DKYVISA_BUILD_TESTS=ON >/dev/null ;; *) cmake --preset "$preset" >/dev/null ;; esac
+  elif [ ! -e "$folder/build.ninja" ]; then
+    cmake --preset "$preset" -DKYVISA_BUILD_TESTS=OFF >/dev/null
+  fi
   if [ $# -gt 0 ]; then cmake --build "$folder" --target "$@"; else cmake --build "$folder"; fi
 }

@@ -1,8 +1,7 @@
 #!/usr/bin/env python3
 """Records a HiSLIP conversation with the simulator and lets an independent dissector read it.
 
-In a network namespace of its own, so that nobody else's traffic is seen. Usage: capture.py SIMULATOR FOLDER. Status 77 (skipped) where
-the system lets nobody record.
+In a network namespace of its own, so that nobody else's traffic is seen. Usage: capture.py SIMULATOR FOLDER.
 """
 import os
 import pathlib
@@ -16,9 +15,8 @@ SIMULATOR, FOLDER = sys.argv[1], pathlib.Path(sys.argv[2])
 PORT = 4880  # the dissector goes by it; free, as the namespace is ours
 
 if os.environ.get("INSIDE_NAMESPACE") != "yes":
-    inside = ["unshare", "-rn", sys.executable, *sys.argv]
-    if subprocess.run(["unshare", "-rn", "true"]).returncode != 0:
-        sys.exit(77)
+    # Root needs no user namespace, which a system may forbid.
+    inside = ["unshare", "-n" if os.geteuid() == 0 else "-rn", sys.executable, *sys.argv]
     sys.exit(subprocess.run(inside, env={**os.environ, "INSIDE_NAMESPACE": "yes"}).returncode)
 
 
