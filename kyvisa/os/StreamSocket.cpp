@@ -15,6 +15,10 @@ namespace kyvisa::os
 namespace
 {
 
+constexpr int IdleSeconds = 60;
+constexpr int ProbeSeconds = 10;
+constexpr int UnansweredProbes = 6;
+
 bool wouldBlock(int error)
 {
     return error == EAGAIN || error == EWOULDBLOCK;
@@ -52,6 +56,12 @@ void StreamSocket::close()
         systemCalls().close(std::exchange(m_descriptor, -1));
 }
 
+void StreamSocket::shutDown()
+{
+    if (isOpen())
+        systemCalls().shutdown(m_descriptor, SHUT_RDWR);
+}
+
 IoResult StreamSocket::waitFor(short events, const WaitLimit &limit) const
 {
     std::array<pollfd, 2> watched = {pollfd{m_descriptor, events, 0}};
@@ -64,6 +74,8 @@ Transfer StreamSocket::send(std::span<iovec> pieces, const WaitLimit &limit)
     if (!isOpen())
         return {IoResult::Closed, 0};
     while (!pieces.empty()) {
+        if (limit.wakeup.raised())
+            return {IoResult::Woken, done.count};
         msghdr message{};
         message.msg_iov = pieces.data();
         message.msg_iovlen = std::min<std::size_t>(pieces.size(), IOV_MAX);
@@ -106,8 +118,11 @@ Transfer StreamSocket::receiveNow(std::span<std::byte> buffer)
 
 Transfer StreamSocket::receive(std::span<std::byte> buffer, const WaitLimit &limit)
 {
-    // Trying first costs next to nothing while the answer is on its way, and saves the wait when it is here.
+    // Trying first costs next to nothing while the answer is on its way, and saves the wait when it is here. A peer that
+    // never lets it come to a wait must not outlast the wake-up, so that is looked at here too.
     for (;;) {
+        if (limit.wakeup.raised())
+            return {IoResult::Woken, 0};
         const Transfer got = receiveNow(buffer);
         if (got.result != IoResult::Done || got.count > 0)
             return got;
@@ -126,7 +141,11 @@ bool StreamSocket::setNoDelay(bool on)
 bool StreamSocket::setKeepAlive(bool on)
 {
     const int value = on ? 1 : 0;
-    return systemCalls().setsockopt(m_descriptor, SOL_SOCKET, SO_KEEPALIVE, &value, sizeof value) == 0;
+    const auto set = [this](int level, int option, int number) {
+        return systemCalls().setsockopt(m_descriptor, level, option, &number, sizeof number) == 0;
+    };
+    return set(IPPROTO_TCP, TCP_KEEPIDLE, IdleSeconds) && set(IPPROTO_TCP, TCP_KEEPINTVL, ProbeSeconds) &&
+           set(IPPROTO_TCP, TCP_KEEPCNT, UnansweredProbes) && set(SOL_SOCKET, SO_KEEPALIVE, value);
 }
 
 std::string StreamSocket::peerAddress() const

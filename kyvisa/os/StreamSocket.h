@@ -34,6 +34,8 @@ public:
 
     bool isOpen() const { return m_descriptor >= 0; }
     void close();
+    /// Ends the connection both ways and keeps the descriptor, so it may come while the other thread is inside.
+    void shutDown();
 
     /// Sends all bytes of all pieces, in one system call where the system takes them. @p pieces is used up on the way.
     Transfer send(std::span<iovec> pieces, const WaitLimit &limit);
@@ -44,6 +46,7 @@ public:
     Transfer receiveNow(std::span<std::byte> buffer);
 
     bool setNoDelay(bool on);
+    /// Asks the peer for a sign of life after a minute of silence: firewalls forget idle connections after a few.
     bool setKeepAlive(bool on);
     /// The peer's address in numbers, or an empty text.
     std::string peerAddress() const;

@@ -15,8 +15,8 @@ int pollWithoutSignalMask(pollfd *descriptors, nfds_t count, const timespec *tim
 }
 
 constexpr SystemCalls Real = {
-    ::socket,  ::connect, pollWithoutSignalMask, ::recv, ::sendmsg, ::setsockopt, ::getsockopt,
-    ::eventfd, ::close,   ::getaddrinfo,
+    ::socket,   ::connect, pollWithoutSignalMask, ::recv, ::sendmsg, ::setsockopt, ::getsockopt, ::eventfd,
+    ::shutdown, ::close,   ::getaddrinfo,
 };
 
 std::atomic<const SystemCalls *> g_calls{&Real};

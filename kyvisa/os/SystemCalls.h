@@ -21,6 +21,7 @@ struct SystemCalls {
     int (*setsockopt)(int descriptor, int level, int option, const void *value, socklen_t length);
     int (*getsockopt)(int descriptor, int level, int option, void *value, socklen_t *length);
     int (*eventfd)(unsigned initial, int flags);
+    int (*shutdown)(int descriptor, int how);
     int (*close)(int descriptor);
     int (*getaddrinfo)(const char *node, const char *service, const addrinfo *hints, addrinfo **result);
 };

@@ -54,9 +54,13 @@ ViStatus HislipAsyncChannel::transact(const Header &request, std::span<const std
         ++m_unanswered[static_cast<std::uint8_t>(expected)];
     }
     std::size_t sent = 0;
-    IoResult result = m_channel.finishMessage(limit);
-    if (result == IoResult::Done)
-        result = m_channel.send(request, payload, limit, sent);
+    IoResult result;
+    {
+        const std::lock_guard sending(m_sending);
+        result = m_channel.finishMessage(limit);
+        if (result == IoResult::Done)
+            result = m_channel.send(request, payload, limit, sent);
+    }
     if (result != IoResult::Done) {
         const std::lock_guard lock(m_mutex);
         unsigned &unanswered = m_unanswered[static_cast<std::uint8_t>(expected)];
@@ -178,15 +182,26 @@ IoResult HislipAsyncChannel::sort(const Header &header, const os::WaitLimit &lim
         if (isResponse(header.type) || header.type == MessageType::Error) {
             keepReply(header, payload);
         } else {
-            const bool vendor = static_cast<std::uint8_t>(header.type) >= 128;
-            const auto code = vendor ? ErrorCode::UnknownVendorMessage : ErrorCode::UnknownMessageType;
-            std::size_t sent = 0;
-            return m_channel.send({MessageType::Error, static_cast<std::uint8_t>(code), 0, 0}, {}, limit, sent);
+            return refuse(header.type, limit.wakeup);
         }
     }
     if (notify)
         notify();
     return IoResult::Done;
+}
+
+/// Answers a message that is not understood, unless that would have to wait: a request on its way out comes first.
+IoResult HislipAsyncChannel::refuse(MessageType type, const os::Wakeup &wakeup)
+{
+    const std::unique_lock sending(m_sending, std::try_to_lock);
+    if (!sending || m_channel.messageIsHalfSent())
+        return IoResult::Done;
+    const bool vendor = static_cast<std::uint8_t>(type) >= 128;
+    const auto code = vendor ? ErrorCode::UnknownVendorMessage : ErrorCode::UnknownMessageType;
+    std::size_t sent = 0;
+    const IoResult result = m_channel.send({MessageType::Error, static_cast<std::uint8_t>(code), 0, 0}, {},
+                                           {os::Deadline::now(), wakeup}, sent);
+    return result == IoResult::TimedOut ? IoResult::Done : result;
 }
 
 void HislipAsyncChannel::keepReply(const Header &header, const std::array<std::byte, 8> &payload)

@@ -54,12 +54,14 @@ private:
 
     ViStatus await(const Condition &condition, const os::WaitLimit &limit);
     os::IoResult receiveOne(const os::WaitLimit &limit);
+    os::IoResult refuse(wire::hislip::MessageType type, const os::Wakeup &wakeup);
     os::IoResult sort(const wire::hislip::Header &header, const os::WaitLimit &limit);
     void keepReply(const wire::hislip::Header &header, const std::array<std::byte, 8> &payload);
     void readForEver();
     std::optional<ViStatus> answered(wire::hislip::MessageType expected, Reply &reply);
 
     HislipChannel m_channel; ///< receiving belongs to the thread once there is one
+    std::mutex m_sending;    ///< the caller's requests, and refusals by whoever receives
     std::unique_ptr<std::thread> m_thread;
     os::Wakeup m_stop;
     os::Wakeup m_news; ///< raised by the thread after each message

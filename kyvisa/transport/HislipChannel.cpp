@@ -126,12 +126,12 @@ IoResult HislipChannel::finishMessage(const os::WaitLimit &limit)
 
 void HislipChannel::fail(FatalErrorCode code)
 {
-    if (isOpen() && !messageIsHalfSent()) {
-        const os::Wakeup nobody;
-        std::size_t sent = 0;
-        send({MessageType::FatalError, static_cast<std::uint8_t>(code), 0, 0}, {}, {os::Deadline::now(), nobody}, sent);
-    }
-    close();
+    // Not send(): what it keeps belongs to the thread that sends. Behind half a message this goes unnoticed.
+    auto bytes = encode({MessageType::FatalError, static_cast<std::uint8_t>(code), 0, 0});
+    std::array pieces = {iovec{bytes.data(), bytes.size()}};
+    const os::Wakeup nobody;
+    m_socket.send(pieces, {os::Deadline::now(), nobody});
+    m_socket.shutDown();
 }
 
 } // namespace kyvisa

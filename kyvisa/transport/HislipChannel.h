@@ -46,7 +46,8 @@ public:
     /// Sends the rest with filler in place of the payload: for a peer that is going to discard it.
     os::IoResult finishMessage(const os::WaitLimit &limit);
 
-    /// Tells the peer that the connection is beyond repair, if that is possible without waiting, and ends it.
+    /// Tells the peer that the connection is beyond repair, if that is possible without waiting, and ends it. The
+    /// descriptor stays until close(): the other thread may be sending.
     void fail(wire::hislip::FatalErrorCode code);
 
 private:

@@ -74,7 +74,8 @@ ViStatus HislipTransport::connect(const ResourceName &name, const os::WaitLimit 
     IoResult connected = os::connectStream(name.host, name.port, limit, socket);
     if (connected != IoResult::Done)
         return connectStatus(connected, limit);
-    attributes.setText(VI_ATTR_TCPIP_ADDR, socket.peerAddress());
+    const std::string address = socket.peerAddress();
+    attributes.setText(VI_ATTR_TCPIP_ADDR, address);
     HislipChannel sync(std::move(socket), InputCapacity);
     Header response;
     ViStatus status = initialize(sync, name.deviceName, response, limit);
@@ -82,7 +83,8 @@ ViStatus HislipTransport::connect(const ResourceName &name, const os::WaitLimit 
         return status;
 
     os::StreamSocket asyncSocket;
-    connected = os::connectStream(name.host, name.port, limit, asyncSocket);
+    // A name may have several addresses: the other connection belongs to the instrument that answered the first.
+    connected = os::connectStream(address.empty() ? name.host : address, name.port, limit, asyncSocket);
     if (connected != IoResult::Done)
         return connectStatus(connected, limit);
     auto async = std::make_unique<HislipAsyncChannel>(std::move(asyncSocket));

@@ -66,7 +66,7 @@ ViStatus SocketTransport::read(std::span<std::byte> buffer, const TransferMode &
 bool SocketTransport::dropInput(const os::WaitLimit &limit)
 {
     m_answerMayBeLate = false;
-    // A peer that never stops sending must not hold the call: the deadline ends this too.
+    // A peer that never stops sending must not hold the call: deadline and wake-up end this too.
     do {
         m_input.clear();
         const os::Transfer got = m_input.fillNow(m_socket);
@@ -74,7 +74,7 @@ bool SocketTransport::dropInput(const os::WaitLimit &limit)
             m_socket.close();
             return false;
         }
-    } while (!m_input.empty() && !limit.deadline.expired());
+    } while (!m_input.empty() && !limit.deadline.expired() && !limit.wakeup.raised());
     m_input.clear();
     return true;
 }
@@ -109,12 +109,16 @@ ViStatus SocketTransport::readStatusByte(const TransferMode &mode, const os::Wai
     const ViStatus got = read(std::as_writable_bytes(std::span(answer)), line, limit, count);
     if (got < VI_SUCCESS)
         return got;
-    const char *first = answer.data();
+    if (got != VI_SUCCESS_TERM_CHAR) {
+        m_answerMayBeLate = true; // what is left of the line is nobody's answer
+        return VI_ERROR_RAW_RD_PROT_VIOL;
+    }
+    const char *first = answer.data(); // a line that ends by its '\n': neither loop nor comparison leaves it
     while (*first == ' ' || *first == '+')
         ++first;
     unsigned value = 0;
     const auto [end, error] = std::from_chars(first, answer.data() + count, value);
-    if (got != VI_SUCCESS_TERM_CHAR || error != std::errc() || value > 0xFF || (*end != '\n' && *end != '\r'))
+    if (error != std::errc() || value > 0xFF || (*end != '\n' && *end != '\r'))
         return VI_ERROR_RAW_RD_PROT_VIOL;
     status = static_cast<ViUInt16>(value);
     return VI_SUCCESS;

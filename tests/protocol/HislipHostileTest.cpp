@@ -171,6 +171,29 @@ TEST(HislipHostile, GarbageOnTheAsynchronousConnectionEndsTheSession)
     }
 }
 
+TEST(HislipHostile, NonsenseThatAThreadReadsDoesNotMeetWhatTheCallerSends)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        HislipConnections client = acceptHislip(self);
+        // Messages of the wrong kind, while the caller asks, and at the end something that is no message at all.
+        for (int i = 0; i < 200; ++i)
+            client.async.trySend(hex("4853FE00 00000000 0000000000000000") + hex("48531642 00000000 0000000000000000"));
+        client.async.trySend("this is no HiSLIP header, is it?");
+        client.sync.expectClosed();
+    });
+    VisaSession session;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    session.set(VI_ATTR_TMO_VALUE, 1000);
+    ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_QUEUE, 0), VI_SUCCESS);
+    ViStatus status = VI_SUCCESS;
+    for (int i = 0; i < 10000 && status != VI_ERROR_CONN_LOST; ++i) {
+        ViUInt16 byte = 0;
+        status = viReadSTB(session.vi, &byte);
+    }
+    EXPECT_EQ(status, VI_ERROR_CONN_LOST);
+    viClose(session.vi);
+}
+
 TEST(HislipHostile, InstrumentThatDoesNotReadStopsTheWriteAndAClearRecovers)
 {
     constexpr std::size_t Size = 64'000'000;

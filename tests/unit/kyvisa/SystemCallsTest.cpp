@@ -11,6 +11,7 @@
 #include <filesystem>
 #include <gtest/gtest.h>
 #include <netinet/in.h>
+#include <netinet/tcp.h>
 #include <thread>
 
 using namespace kyvisa::os;
@@ -240,6 +241,52 @@ TEST(Resolver, UnknownNameIsNoAddress)
     std::vector<Address> addresses;
     const Wakeup nobody;
     EXPECT_EQ(resolve("nowhere.example", 1, within(20000, nobody), addresses), IoResult::NoAddress);
+}
+
+TEST(StreamSocket, WakeUpEndsAReceptionThatNeverHasToWait)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
+    Wakeup wakeup;
+    StreamSocket socket;
+    ASSERT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, wakeup), socket), IoResult::Done);
+    SystemCalls seam = realSystemCalls();
+    seam.recv = [](int, void *, size_t size, int) { return static_cast<ssize_t>(size); }; // there is always more
+    seam.sendmsg = [](int, const msghdr *, int) -> ssize_t { return 1; };
+    const ReplacedSystemCalls replaced(seam);
+    std::array<std::byte, 16> buffer{};
+    const WaitLimit endless{Deadline::never(), wakeup};
+    EXPECT_EQ(socket.receive(buffer, endless).result, IoResult::Done);
+    wakeup.close();
+    EXPECT_EQ(socket.receive(buffer, endless).result, IoResult::Woken);
+    std::array pieces = {iovec{buffer.data(), buffer.size()}};
+    const Transfer sent = socket.send(pieces, endless);
+    EXPECT_EQ(sent.result, IoResult::Woken);
+    EXPECT_EQ(sent.count, 0u);
+}
+
+TEST(StreamSocket, KeepAliveSpeaksUpBeforeAFirewallForgetsTheConnection)
+{
+    static int idle;
+    static int on;
+    idle = on = 0;
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
+    const Wakeup nobody;
+    StreamSocket socket;
+    ASSERT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    SystemCalls seam = realSystemCalls();
+    seam.setsockopt = [](int, int level, int option, const void *value, socklen_t) {
+        if (level == SOL_SOCKET && option == SO_KEEPALIVE)
+            on = *static_cast<const int *>(value);
+        if (level == IPPROTO_TCP && option == TCP_KEEPIDLE)
+            idle = *static_cast<const int *>(value);
+        return 0;
+    };
+    const ReplacedSystemCalls replaced(seam);
+    EXPECT_TRUE(socket.setKeepAlive(true));
+    EXPECT_EQ(on, 1);
+    EXPECT_EQ(idle, 60); // seconds; the usual limit is five minutes
+    EXPECT_TRUE(socket.setKeepAlive(false));
+    EXPECT_EQ(on, 0);
 }
 
 TEST(StreamSocket, SurvivesInterruptedAndShortCalls)
