@@ -39,7 +39,8 @@ ViStatus onObject(ViObject handle, const Work &work) noexcept
 
 inline ViStatus reported(InstrumentSession &session, const char *operation, ViStatus status)
 {
-    if (status < VI_SUCCESS)
+    // In a forked child the hub's mutex and threads are those of another process.
+    if (status < VI_SUCCESS && !session.inherited())
         session.events().raiseException({.type = VI_EVENT_EXCEPTION, .status = status, .operation = operation});
     return status;
 }

@@ -93,7 +93,8 @@ ViStatus InstrumentSession::open(ViSession handle, ViAccessMode accessMode, ViUI
     }
     if ((accessMode & VI_EXCLUSIVE_LOCK) != 0) {
         std::string key;
-        const ViStatus locked = m_locks->lock(this, VI_EXCLUSIVE_LOCK, timeout, {}, m_closing, key);
+        const ViUInt32 left = timeout == VI_TMO_IMMEDIATE ? timeout : deadline.visaTimeoutLeft();
+        const ViStatus locked = m_locks->lock(this, VI_EXCLUSIVE_LOCK, left, {}, m_closing, key);
         // The caller asked for a resource and a lock at once: the lock, not the connection, is what was not to be had.
         if (locked == VI_ERROR_TMO)
             return VI_ERROR_RSRC_LOCKED;
@@ -135,11 +136,16 @@ ViStatus InstrumentSession::perform(const Operation &operation)
 {
     const auto timeout = static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE));
     const auto deadline = os::Deadline::afterVisaTimeout(timeout);
-    ViStatus status = mayTransfer(deadline);
-    if (status == VI_SUCCESS)
-        status = enterGate(deadline);
-    if (status != VI_SUCCESS)
-        return status;
+    const ViStatus status = mayTransfer(deadline);
+    return status == VI_SUCCESS ? inTurn(deadline, operation) : status;
+}
+
+template <typename Operation>
+ViStatus InstrumentSession::inTurn(os::Deadline deadline, const Operation &operation)
+{
+    const ViStatus entered = enterGate(deadline);
+    if (entered != VI_SUCCESS)
+        return entered;
     const Turn turn(m_gate);
     return operation({deadline, m_wakeup});
 }
@@ -227,6 +233,8 @@ ViStatus InstrumentSession::terminate(ViUInt16 degree, ViJobId job)
         return VI_ERROR_INV_DEGREE;
     if (job != VI_NULL)
         return VI_ERROR_INV_JOB_ID;
+    if (inherited())
+        return VI_ERROR_CONN_LOST;
     m_wakeup.terminate();
     return VI_SUCCESS;
 }
@@ -309,7 +317,11 @@ ViStatus InstrumentSession::setAttribute(ViAttr attribute, ViAttrState state)
     case VI_ATTR_TCPIP_KEEPALIVE:
     case VI_ATTR_TCPIP_HISLIP_MAX_MESSAGE_KB:
     case VI_ATTR_TCPIP_HISLIP_OVERLAP_EN: {
-        const ViStatus applied = perform([&](const os::WaitLimit &limit) {
+        if (inherited())
+            return VI_ERROR_CONN_LOST;
+        // Local attributes ignore the locks of others, so this takes the turn without asking for them.
+        const auto timeout = static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE));
+        const ViStatus applied = inTurn(os::Deadline::afterVisaTimeout(timeout), [&](const os::WaitLimit &limit) {
             return m_transport->applyAttribute(attribute, static_cast<ViUInt64>(value), limit);
         });
         if (applied != VI_SUCCESS)

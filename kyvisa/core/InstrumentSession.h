@@ -69,6 +69,8 @@ public:
 private:
     template <typename Operation>
     ViStatus perform(const Operation &operation);
+    template <typename Operation>
+    ViStatus inTurn(os::Deadline deadline, const Operation &operation);
     ViStatus mayTransfer(os::Deadline deadline);
     ViStatus enterGate(os::Deadline deadline);
     TransferMode transferMode() const;

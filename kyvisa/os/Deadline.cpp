@@ -23,6 +23,12 @@ bool Deadline::expired() const
     return !isNever() && Clock::now() >= m_end;
 }
 
+std::uint32_t Deadline::visaTimeoutLeft() const
+{
+    return isNever() ? 0xFFFFFFFFu
+                     : static_cast<std::uint32_t>(std::chrono::ceil<std::chrono::milliseconds>(remaining()).count());
+}
+
 std::chrono::nanoseconds Deadline::remaining() const
 {
     const auto now = Clock::now();

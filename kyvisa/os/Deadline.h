@@ -29,6 +29,8 @@ public:
     bool expired() const;
     /// Zero once expired. Meaningless for never().
     std::chrono::nanoseconds remaining() const;
+    /// What is left as a VISA time-out, rounded up to milliseconds.
+    std::uint32_t visaTimeoutLeft() const;
     Clock::time_point end() const { return m_end; }
     Deadline orEarlier(Deadline other) const { return m_end <= other.m_end ? *this : other; }
 

@@ -10,6 +10,7 @@
 using test::acceptHislip;
 using test::hex;
 using test::HislipConnections;
+using test::PeerConnection;
 using test::ScriptedPeer;
 using test::Stopwatch;
 using test::VisaSession;
@@ -640,6 +641,31 @@ TEST(Hislip, SilenceWhileOpeningEndsWithTheTimeOut)
     EXPECT_EQ(session.open(resource(peer), 100), VI_ERROR_TMO);
     EXPECT_GE(watch.milliseconds(), 100);
     EXPECT_LT(watch.milliseconds(), 10000);
+}
+
+TEST(Hislip, WaitForTheLockWhileOpeningEndsWithTheTimeOutOfTheWholeCall)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        HislipConnections holder = acceptHislip(self);
+        PeerConnection sync = self.accept();
+        std::this_thread::sleep_for(std::chrono::milliseconds(1500));
+        sync.expect(hex("48530000 01005A5A 0000000000000007") + "hislip0");
+        sync.send(hex("48530100 01004321 0000000000000000"));
+        PeerConnection async = self.accept();
+        async.expect(hex("48531100 00004321 0000000000000000"));
+        async.send(hex("48531200 00005858 0000000000000000"));
+        async.expect(hex("48530F00 00000000 0000000000000008 0000000000100000"));
+        async.send(hex("48531000 00000000 0000000000000008 0000000000100000"));
+        async.expectClosed();
+        holder.sync.expectClosed();
+    });
+    VisaSession holder;
+    ASSERT_EQ(holder.open(resource(peer), 20000, VI_EXCLUSIVE_LOCK), VI_SUCCESS);
+    VisaSession late;
+    const Stopwatch watch;
+    EXPECT_EQ(late.open(resource(peer), 3000, VI_EXCLUSIVE_LOCK), VI_ERROR_RSRC_LOCKED);
+    EXPECT_LT(watch.milliseconds(), 4300); // 1,500 of the 3,000 were gone when the wait for the lock began
+    viClose(holder.vi);
 }
 
 TEST(Hislip, OpenTimeOutOfZeroMeansTwoSeconds)

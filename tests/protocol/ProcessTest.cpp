@@ -66,6 +66,13 @@ TEST(Process, ForkedChildMayCloseAndOpenAnewAndTheParentNoticesNothing)
             return 1;
         if (session.write("x") != VI_ERROR_CONN_LOST)
             return 2;
+        // The events are the parent's: nothing would ever end this wait.
+        if (viWaitOnEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_TMO_INFINITE, nullptr, nullptr) != VI_ERROR_CONN_LOST)
+            return 7;
+        if (viDisableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_ALL_MECH) != VI_ERROR_CONN_LOST)
+            return 8;
+        if (viTerminate(session.vi, VI_NULL, VI_NULL) != VI_ERROR_CONN_LOST)
+            return 9;
         ViSession fresh = VI_NULL;
         if (viOpen(session.rm, resource(peer).c_str(), 0, 10000, &fresh) != VI_SUCCESS)
             return 3;

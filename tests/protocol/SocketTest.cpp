@@ -113,6 +113,26 @@ TEST(Socket, TalksAboutTheStatusByteOnlyIn4882Mode)
     viClose(session.vi);
 }
 
+TEST(Socket, StatusAnswerOfNothingButBlanksIsRefusedAndItsRestIsDropped)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        PeerConnection client = self.accept();
+        client.expect("*STB?\n");
+        client.send(std::string(64, ' ') + "12\n");
+        client.expect("*STB?\n");
+        client.send("5\n");
+        client.expectClosed();
+    });
+    VisaSession session;
+    ViUInt16 status = 0;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(session.set(VI_ATTR_IO_PROT, VI_PROT_4882_STRS), VI_SUCCESS);
+    EXPECT_EQ(viReadSTB(session.vi, &status), VI_ERROR_RAW_RD_PROT_VIOL);
+    EXPECT_EQ(viReadSTB(session.vi, &status), VI_SUCCESS);
+    EXPECT_EQ(status, 5);
+    viClose(session.vi);
+}
+
 TEST(Socket, RefusesWhatSocketsDoNotHave)
 {
     ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
@@ -536,7 +556,10 @@ TEST(Socket, ExclusiveLockOfAnotherSessionKeepsTransfersOut)
     EXPECT_EQ(other.get<ViUInt32>(VI_ATTR_RSRC_LOCK_STATE), static_cast<ViUInt32>(VI_EXCLUSIVE_LOCK));
     EXPECT_EQ(other.write("too early"), VI_ERROR_RSRC_LOCKED);
     EXPECT_EQ(other.read(), VI_ERROR_RSRC_LOCKED);
+    // Local attributes are the session's own business, also those that mean something to its connection.
     EXPECT_EQ(other.set(VI_ATTR_TMO_VALUE, 3000), VI_SUCCESS);
+    EXPECT_EQ(other.set(VI_ATTR_TCPIP_KEEPALIVE, VI_TRUE), VI_SUCCESS);
+    EXPECT_EQ(other.set(VI_ATTR_TCPIP_NODELAY, VI_FALSE), VI_SUCCESS);
     EXPECT_EQ(viLock(other.vi, VI_EXCLUSIVE_LOCK, VI_TMO_IMMEDIATE, nullptr, nullptr), VI_ERROR_RSRC_LOCKED);
     EXPECT_EQ(viLock(other.vi, VI_EXCLUSIVE_LOCK, 30, nullptr, nullptr), VI_ERROR_TMO);
     EXPECT_EQ(viUnlock(other.vi), VI_ERROR_SESN_NLOCKED);
