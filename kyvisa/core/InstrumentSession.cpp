@@ -112,8 +112,13 @@ ViStatus InstrumentSession::mayTransfer(os::Deadline deadline)
         return VI_ERROR_INV_OBJECT;
     if (!m_locks->heldByOther(this))
         return VI_SUCCESS;
-    if (m_transport->deviceHasLocks() && m_locks->awaitAccess(this, deadline, m_closing))
+    const unsigned before = m_terminations.load();
+    const auto terminated = [&] { return m_terminations.load() != before; };
+    if (m_transport->deviceHasLocks() &&
+        m_locks->awaitAccess(this, deadline, [&] { return m_closing.load() || terminated(); }))
         return VI_SUCCESS;
+    if (terminated() && !m_closing.load())
+        return VI_ERROR_ABORT;
     return m_closing.load() ? VI_ERROR_INV_OBJECT : VI_ERROR_RSRC_LOCKED;
 }
 
@@ -235,7 +240,9 @@ ViStatus InstrumentSession::terminate(ViUInt16 degree, ViJobId job)
         return VI_ERROR_INV_JOB_ID;
     if (inherited())
         return VI_ERROR_CONN_LOST;
+    ++m_terminations;
     m_wakeup.terminate();
+    m_locks->wake();
     return VI_SUCCESS;
 }
 

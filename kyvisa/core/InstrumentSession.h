@@ -84,6 +84,7 @@ private:
     os::Wakeup m_wakeup;
     IoGate m_gate;
     std::atomic<ViJobId> m_lastJob{0};
+    std::atomic<unsigned> m_terminations{0}; ///< tells a wait that began before viTerminate from one that began after
     std::atomic<bool> m_opened{false};
     std::atomic<bool> m_closing{false};
 };

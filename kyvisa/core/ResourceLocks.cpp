@@ -143,10 +143,10 @@ bool ResourceLocks::heldByOther(LockHolder holder) const
     return shutOut(holder);
 }
 
-bool ResourceLocks::awaitAccess(LockHolder holder, os::Deadline deadline, const std::atomic<bool> &closing)
+bool ResourceLocks::awaitAccess(LockHolder holder, os::Deadline deadline, const std::function<bool()> &givenUp)
 {
     std::unique_lock lock(m_mutex);
-    os::waitUntil(m_changed, lock, deadline, [&] { return !shutOut(holder) || closing.load(); });
+    os::waitUntil(m_changed, lock, deadline, [&] { return !shutOut(holder) || givenUp(); });
     return !shutOut(holder);
 }
 

@@ -5,6 +5,7 @@
 
 #include <atomic>
 #include <condition_variable>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -38,8 +39,9 @@ public:
     void wake();
 
     bool heldByOther(LockHolder holder) const;
-    /// Waits until no other holder shuts @p holder out. False when the deadline or @p closing came first.
-    bool awaitAccess(LockHolder holder, os::Deadline deadline, const std::atomic<bool> &closing);
+    /// Waits until no other holder shuts @p holder out. False when the deadline came first, or @p givenUp, which is asked
+    /// again after each wake().
+    bool awaitAccess(LockHolder holder, os::Deadline deadline, const std::function<bool()> &givenUp);
 
     /// VI_NO_LOCK, VI_EXCLUSIVE_LOCK or VI_SHARED_LOCK.
     ViAccessMode state() const;

@@ -668,6 +668,33 @@ TEST(Hislip, WaitForTheLockWhileOpeningEndsWithTheTimeOutOfTheWholeCall)
     viClose(holder.vi);
 }
 
+TEST(Hislip, TerminateEndsAWaitForAnotherSessionsLock)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        HislipConnections holder = acceptHislip(self);
+        HislipConnections other = acceptHislip(self);
+        other.sync.expectClosed();
+        holder.sync.expectClosed();
+    });
+    VisaSession holder;
+    VisaSession other;
+    ASSERT_EQ(holder.open(resource(peer), 20000, VI_EXCLUSIVE_LOCK), VI_SUCCESS);
+    ASSERT_EQ(other.open(resource(peer), 20000), VI_SUCCESS);
+    other.set(VI_ATTR_TMO_VALUE, 20000);
+    std::atomic<bool> ended{false};
+    std::thread writer([&] {
+        EXPECT_EQ(other.write("?\n"), VI_ERROR_ABORT);
+        ended = true;
+    });
+    while (!ended) {
+        EXPECT_EQ(viTerminate(other.vi, VI_NULL, VI_NULL), VI_SUCCESS);
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    writer.join();
+    viClose(other.vi);
+    viClose(holder.vi);
+}
+
 TEST(Hislip, OpenTimeOutOfZeroMeansTwoSeconds)
 {
     ScriptedPeer peer([](ScriptedPeer &self) {
