@@ -51,6 +51,23 @@ need_packages() {
   rm -f "$log"
 }
 
+# Unpacks the packages of kind "unpack" into build/unpacked, once. For their programs alone: nothing of them is installed or started.
+unpack_packages() {
+  local name folder
+  command -v apt-get >/dev/null || return 0
+  for name in $(packages_of unpack); do
+    [ -e "build/unpacked/$name" ] && continue
+    say "unpacking $name"
+    folder=$(mktemp -d)
+    # _apt cannot write into a folder of ours; apt-get says so and goes on as who we are.
+    (cd "$folder" && apt-get download -qq "$name" >/dev/null 2>&1) || fail "downloading $name failed"
+    mkdir -p build/unpacked
+    dpkg -x "$folder/$name"_*.deb build/unpacked
+    touch "build/unpacked/$name"
+    rm -rf "$folder"
+  done
+}
+
 # Configures and builds a preset; further arguments are targets. The tests need packages that the programs do not: with
 # targets given, a folder that is new is configured without them.
 build_preset() {
