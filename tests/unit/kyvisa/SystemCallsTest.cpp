@@ -1,7 +1,12 @@
 // The bottom layer when the system says no: each call fails once, nothing leaks, nothing hangs.
 #include "kyvisa/os/SystemCalls.h"
+#include "kyvisa/core/AttributeStore.h"
+#include "kyvisa/core/ResourceName.h"
+#include "kyvisa/include/visa.h"
 #include "kyvisa/os/Connector.h"
 #include "kyvisa/os/Resolver.h"
+#include "kyvisa/transport/HislipTransport.h"
+#include "support/HislipPeer.h"
 #include "support/ScriptedPeer.h"
 #include "support/Stopwatch.h"
 
@@ -10,6 +15,7 @@
 #include <cerrno>
 #include <filesystem>
 #include <gtest/gtest.h>
+#include <memory>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
 #include <thread>
@@ -241,6 +247,30 @@ TEST(Resolver, UnknownNameIsNoAddress)
     std::vector<Address> addresses;
     const Wakeup nobody;
     EXPECT_EQ(resolve("nowhere.example", 1, within(20000, nobody), addresses), IoResult::NoAddress);
+}
+
+TEST(HislipTransport, ConnectsTwiceToOneAddressOfAHostThatHasSeveral)
+{
+    static std::atomic<int> questions;
+    questions = 0;
+    SystemCalls seam = realSystemCalls();
+    seam.getaddrinfo = [](const char *node, const char *service, const addrinfo *hints, addrinfo **result) {
+        if (std::string_view(node) != "several.test")
+            return ::getaddrinfo(node, service, hints, result);
+        if ((hints->ai_flags & AI_NUMERICHOST) != 0 || questions++ > 0)
+            return EAI_NONAME; // asked again it would name another instrument
+        return ::getaddrinfo("127.0.0.1", service, hints, result);
+    };
+    ScriptedPeer peer([](ScriptedPeer &self) { test::acceptHislip(self).sync.expectClosed(); });
+    kyvisa::ResourceName name;
+    ASSERT_EQ(kyvisa::parseResourceName("TCPIP::several.test::hislip0," + std::to_string(peer.port()), name),
+              VI_SUCCESS);
+    const Wakeup nobody;
+    const ReplacedSystemCalls replaced(seam);
+    kyvisa::AttributeStore attributes(kyvisa::kind::Hislip);
+    std::unique_ptr<kyvisa::Transport> transport;
+    EXPECT_EQ(kyvisa::HislipTransport::connect(name, within(20000, nobody), attributes, transport), VI_SUCCESS);
+    EXPECT_EQ(questions, 1);
 }
 
 TEST(StreamSocket, WakeUpEndsAReceptionThatNeverHasToWait)
