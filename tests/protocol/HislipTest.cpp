@@ -682,6 +682,7 @@ TEST(Hislip, TerminateEndsAWaitForAnotherSessionsLock)
     ASSERT_EQ(other.open(resource(peer), 20000), VI_SUCCESS);
     other.set(VI_ATTR_TMO_VALUE, 20000);
     std::atomic<bool> ended{false};
+    const Stopwatch watch;
     std::thread writer([&] {
         EXPECT_EQ(other.write("?\n"), VI_ERROR_ABORT);
         ended = true;
@@ -691,6 +692,7 @@ TEST(Hislip, TerminateEndsAWaitForAnotherSessionsLock)
         std::this_thread::sleep_for(std::chrono::milliseconds(5));
     }
     writer.join();
+    EXPECT_LT(watch.milliseconds(), 15000); // not by the time-out
     viClose(other.vi);
     viClose(holder.vi);
 }
