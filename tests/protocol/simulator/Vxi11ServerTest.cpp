@@ -185,6 +185,19 @@ TEST_F(Vxi11Server, WritesWhileACommandWaitsAndReadsWhatItGives)
     EXPECT_EQ(client.query("SYST:ERR?\n"), "0,\"No error\"\n");
 }
 
+TEST_F(Vxi11Server, TakesWritesAndPollsWhileACommandWaits)
+{
+    Vxi11Client client(port);
+    client.write("SYST:DEL 60\n");
+    for (int i = 0; i < 3; ++i)
+        EXPECT_EQ(client.core.call("0000000B", client.link + "00000000 00000000 00000008 00000006", "*OPC?\n"),
+                  "00000000 00000006 ")
+            << "without waiting: the I/O time-out is 0";
+    EXPECT_EQ(client.statusByte(), "00000000 00000000 ");
+    EXPECT_EQ(client.generic("0000000F"), "00000000 ");
+    EXPECT_EQ(client.query("SYST:ERR:ALL?\n"), "0,\"No error\"\n") << "none of them was executed";
+}
+
 TEST_F(Vxi11Server, InputOfAWaitingCommandIsBounded)
 {
     Vxi11Client client(port);
