@@ -74,8 +74,15 @@ TEST_F(Vxi11Interrupt, WorksWithoutAChannelAndWithOneThatBroke)
     client.write("*SRE 16\n");
     EXPECT_EQ(client.query("*OPC?\n"), "1\n");
     {
-        ScriptedPeer controller([](ScriptedPeer &self) { self.accept().reset(); });
+        // A reset before the simulator has answered would be a channel that never came about.
+        std::promise<void> answered;
+        ScriptedPeer controller([&](ScriptedPeer &self) {
+            PeerConnection channel = self.accept();
+            answered.get_future().wait_for(std::chrono::seconds(30));
+            channel.reset();
+        });
         ASSERT_EQ(create(controller.port()), "00000000 ");
+        answered.set_value();
     }
     EXPECT_EQ(client.statusByte(), "00000000 00000000 ");
     EXPECT_EQ(client.query("*OPC?\n"), "1\n");
