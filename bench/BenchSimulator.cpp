@@ -23,13 +23,15 @@ BenchSimulator::BenchSimulator()
         ::dup2(out[1], STDOUT_FILENO);
         ::close(out[0]);
         ::close(out[1]);
-        ::execl(SIMULATOR_PROGRAM, SIMULATOR_PROGRAM, "--hislip", "0", "--socket", "0", nullptr);
+        ::execl(SIMULATOR_PROGRAM, SIMULATOR_PROGRAM, "--hislip", "0", "--socket", "0", "--vxi11", "0", "--portmapper",
+                "0", nullptr);
         ::_exit(127);
     }
     ::close(out[1]);
     std::unique_ptr<FILE, int (*)(FILE *)> said(::fdopen(out[0], "r"), &::fclose);
     const std::regex hislip("hislip TCPIP::127\\.0\\.0\\.1::hislip0,([0-9]+)::INSTR\n");
     const std::regex socket("socket TCPIP::127\\.0\\.0\\.1::([0-9]+)::SOCKET\n");
+    const std::regex portmapper("portmapper 127\\.0\\.0\\.1 ([0-9]+)\n");
     char line[512];
     while (std::fgets(line, sizeof line, said.get())) {
         std::cmatch match;
@@ -37,10 +39,12 @@ BenchSimulator::BenchSimulator()
             m_hislip = static_cast<std::uint16_t>(std::stoi(match[1]));
         else if (std::regex_match(line, match, socket))
             m_socket = static_cast<std::uint16_t>(std::stoi(match[1]));
+        else if (std::regex_match(line, match, portmapper))
+            m_portmapper = static_cast<std::uint16_t>(std::stoi(match[1]));
         else if (std::string(line) == "ready\n")
             break;
     }
-    if (m_hislip == 0 || m_socket == 0)
+    if (m_hislip == 0 || m_socket == 0 || m_portmapper == 0)
         throw std::runtime_error("the simulator did not start");
     // The pipe is closed from here on: the simulator says nothing more on its own.
 }

@@ -19,11 +19,13 @@ public:
 
     std::uint16_t hislipPort() const { return m_hislip; }
     std::uint16_t socketPort() const { return m_socket; }
+    std::uint16_t portmapperPort() const { return m_portmapper; }
 
 private:
     pid_t m_process = -1;
     std::uint16_t m_hislip = 0;
     std::uint16_t m_socket = 0;
+    std::uint16_t m_portmapper = 0;
 };
 
 } // namespace bench

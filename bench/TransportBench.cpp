@@ -1,6 +1,7 @@
-// Queries and blocks over raw socket and HiSLIP: libkyvisa against bare clients on the same simulator, all on one core.
+// Queries over raw socket, HiSLIP and VXI-11, blocks over the first two: libkyvisa against bare clients on the same simulator, all on one core.
 
 #include "bench/BareClient.h"
+#include "bench/BareVxi11.h"
 #include "bench/BenchSimulator.h"
 
 #include <visa.h>
@@ -32,19 +33,32 @@ void must(ViStatus status, const char *what)
     }
 }
 
+enum class Protocol { Socket, Hislip, Vxi11 };
+
+std::string resourceOf(Protocol protocol)
+{
+    switch (protocol) {
+    case Protocol::Socket:
+        return "TCPIP::127.0.0.1::" + std::to_string(simulator->socketPort()) + "::SOCKET";
+    case Protocol::Hislip:
+        return "TCPIP::127.0.0.1::hislip0," + std::to_string(simulator->hislipPort()) + "::INSTR";
+    case Protocol::Vxi11:
+        break;
+    }
+    return "TCPIP::127.0.0.1::inst0::INSTR";
+}
+
 /// A session of libkyvisa on the benchmark's simulator.
 class Session
 {
 public:
-    explicit Session(bool hislip)
+    explicit Session(Protocol protocol)
     {
-        const std::string resource =
-            hislip ? "TCPIP::127.0.0.1::hislip0," + std::to_string(simulator->hislipPort()) + "::INSTR"
-                   : "TCPIP::127.0.0.1::" + std::to_string(simulator->socketPort()) + "::SOCKET";
+        const std::string resource = resourceOf(protocol);
         must(viOpenDefaultRM(&m_manager), "viOpenDefaultRM");
         must(viOpen(m_manager, resource.c_str(), VI_NO_LOCK, 2000, &m_session), "viOpen");
         must(viSetAttribute(m_session, VI_ATTR_TMO_VALUE, 30000), "time-out");
-        if (!hislip)
+        if (protocol == Protocol::Socket)
             must(viSetAttribute(m_session, VI_ATTR_TERMCHAR_EN, VI_TRUE), "termination character");
     }
 
@@ -107,9 +121,18 @@ void bareHislipQuery(benchmark::State &state)
     state.SetItemsProcessed(state.iterations());
 }
 
-void kyvisaQuery(benchmark::State &state, bool hislip)
+void bareVxi11Query(benchmark::State &state)
 {
-    Session session(hislip);
+    bench::BareVxi11 vxi11(simulator->portmapperPort());
+    char answer[1024];
+    for (auto _ : state)
+        benchmark::DoNotOptimize(vxi11.query(Query, answer, sizeof answer));
+    state.SetItemsProcessed(state.iterations());
+}
+
+void kyvisaQuery(benchmark::State &state, Protocol protocol)
+{
+    Session session(protocol);
     char answer[1024];
     for (auto _ : state)
         benchmark::DoNotOptimize(session.query(answer, sizeof answer));
@@ -142,9 +165,9 @@ std::string blockMessage()
     return message;
 }
 
-void kyvisaBlockWrite(benchmark::State &state, bool hislip)
+void kyvisaBlockWrite(benchmark::State &state, Protocol protocol)
 {
-    Session session(hislip);
+    Session session(protocol);
     const std::string message = blockMessage();
     char answer[8];
     for (auto _ : state) {
@@ -156,13 +179,13 @@ void kyvisaBlockWrite(benchmark::State &state, bool hislip)
     state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * BlockSize));
 }
 
-void kyvisaBlockRead(benchmark::State &state, bool hislip)
+void kyvisaBlockRead(benchmark::State &state, Protocol protocol)
 {
-    Session session(hislip);
+    Session session(protocol);
     session.write(blockMessage());
     const std::size_t answerSize = 10 + BlockSize + 1; // "#8" and eight digits, the bytes, the line feed
     std::vector<char> answer(answerSize);
-    if (!hislip)
+    if (protocol == Protocol::Socket)
         session.terminationCharacter(false);
     for (auto _ : state) {
         session.write("MMEM:DATA? \"bench\"\n");
@@ -176,15 +199,17 @@ void kyvisaBlockRead(benchmark::State &state, bool hislip)
 } // namespace
 
 BENCHMARK(bareSocketQuery)->UseRealTime();
-BENCHMARK_CAPTURE(kyvisaQuery, socket, false)->UseRealTime();
+BENCHMARK_CAPTURE(kyvisaQuery, socket, Protocol::Socket)->UseRealTime();
 BENCHMARK(bareHislipQuery)->UseRealTime();
-BENCHMARK_CAPTURE(kyvisaQuery, hislip, true)->UseRealTime();
+BENCHMARK_CAPTURE(kyvisaQuery, hislip, Protocol::Hislip)->UseRealTime();
+BENCHMARK(bareVxi11Query)->UseRealTime();
+BENCHMARK_CAPTURE(kyvisaQuery, vxi11, Protocol::Vxi11)->UseRealTime();
 BENCHMARK(bareBlockWrite)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockWrite, socket, false)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockWrite, hislip, true)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(kyvisaBlockWrite, socket, Protocol::Socket)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(kyvisaBlockWrite, hislip, Protocol::Hislip)->UseRealTime()->Unit(benchmark::kMillisecond);
 BENCHMARK(bareBlockRead)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockRead, socket, false)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockRead, hislip, true)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(kyvisaBlockRead, socket, Protocol::Socket)->UseRealTime()->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(kyvisaBlockRead, hislip, Protocol::Hislip)->UseRealTime()->Unit(benchmark::kMillisecond);
 
 int main(int argc, char **argv)
 {
@@ -196,6 +221,7 @@ int main(int argc, char **argv)
 
     bench::BenchSimulator onTheSameCore;
     simulator = &onTheSameCore;
+    ::setenv("KYVISA_PORTMAPPER_PORT", std::to_string(onTheSameCore.portmapperPort()).c_str(), 1);
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv))
         return 2;

@@ -61,10 +61,19 @@ def at_least(what, times, ours, rival, target):
 times, _ = measure("bench-transport")
 at_least("*IDN? query, raw socket, against a bare client", times, "kyvisaQuery/socket", "bareSocketQuery", 0.85)
 at_least("*IDN? query, HiSLIP, against a bare client", times, "kyvisaQuery/hislip", "bareHislipQuery", 0.85)
+at_least("*IDN? query, VXI-11, against a bare client", times, "kyvisaQuery/vxi11", "bareVxi11Query", 0.85)
 for direction in ("Write", "Read"):
     for protocol in ("socket", "hislip"):
         at_least(f"64 MiB block {direction.lower()}, {protocol}, against a bare copy", times,
                  f"kyvisaBlock{direction}/{protocol}", f"bareBlock{direction}", 0.8)
+
+strangers = subprocess.run([pathlib.Path(__file__).with_name("strangers.py"), options.programs, "--repetitions", str(options.repetitions)],
+                           capture_output=True, text=True, check=False)
+if strangers.returncode != 0:
+    sys.exit(f"strangers.py ended with status {strangers.returncode}: {strangers.stderr[-2000:]}")
+times = json.loads(strangers.stdout)
+at_least("*IDN? query, VXI-11, against lxi benchmark", times, "kyvisa", "lxi", 1.0)
+at_least("*IDN? query, VXI-11, against PyVISA in pure Python", times, "kyvisa", "pyvisa-py", 3.0)
 
 if (options.programs / "bench-log").exists():
     times, counters = measure("bench-log")

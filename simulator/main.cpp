@@ -1,13 +1,16 @@
 #include "simulator/Options.h"
 #include "simulator/Services.h"
 #include "simulator/server/EventLoop.h"
+#include "simulator/traffic/LogPrinter.h"
 
 #include <sys/epoll.h>
 #include <sys/signalfd.h>
+#include <unistd.h>
 
 #include <csignal>
 #include <exception>
 #include <iostream>
+#include <optional>
 
 namespace
 {
@@ -37,6 +40,11 @@ int main(int argc, char **argv)
         simulator::Services services(loop, options);
         if (!options.quiet)
             services.announce(std::cout, std::cerr);
+        std::optional<simulator::LogPrinter> log;
+        if (options.log) {
+            std::signal(SIGPIPE, SIG_IGN); // who reads the log may go: the instrument stays
+            log.emplace(loop, services.traffic(), STDOUT_FILENO);
+        }
         loop.run();
         return 0;
     } catch (const std::exception &error) {

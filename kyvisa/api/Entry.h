@@ -67,18 +67,6 @@ ViStatus onResourceManager(ViSession handle, const Work &work) noexcept
     });
 }
 
-/// For operations that no session of this library lists.
-inline ViStatus unsupported(ViSession handle, const char *operation) noexcept
-{
-    return onInstrument(handle, operation, [](InstrumentSession &) { return VI_ERROR_NSUP_OPER; });
-}
-
-/// For operations that sessions list and this version does not carry out.
-inline ViStatus unimplemented(ViSession handle, const char *operation) noexcept
-{
-    return onInstrument(handle, operation, [](InstrumentSession &) { return VI_ERROR_NIMPL_OPER; });
-}
-
 template <typename Value>
 void storeIfWanted(Value *to, Value value)
 {

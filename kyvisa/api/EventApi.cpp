@@ -1,4 +1,4 @@
-#include "kyvisa/api/Entry.h"
+#include "kyvisa/api/Call.h"
 #include "kyvisa/core/EventContext.h"
 
 using namespace kyvisa;
@@ -9,11 +9,11 @@ namespace
 
 /// Sessions other than those on instruments have no events: for them every type is an invalid one. Those of a session that
 /// a fork inherited are its parent's.
-template <typename Work>
-ViStatus onEvents(ViSession vi, const char *operation, const Work &work)
+template <typename Called, typename Work>
+ViStatus onEvents(const Called &call, ViSession vi, const Work &work)
 {
-    return onInstrument(
-        vi, operation,
+    return call.onInstrument(
+        vi,
         [&](InstrumentSession &session) -> ViStatus {
             return session.inherited() ? VI_ERROR_CONN_LOST : work(session);
         },
@@ -24,19 +24,19 @@ ViStatus onEvents(ViSession vi, const char *operation, const Work &work)
 
 ViStatus viEnableEvent(ViSession vi, ViEventType eventType, ViUInt16 mechanism, ViEventFilter context)
 {
-    return onEvents(vi, "viEnableEvent",
+    return onEvents(Call("viEnableEvent", vi, eventType, mechanism, context), vi,
                     [&](InstrumentSession &session) { return session.enableEvent(eventType, mechanism, context); });
 }
 
 ViStatus viDisableEvent(ViSession vi, ViEventType eventType, ViUInt16 mechanism)
 {
-    return onEvents(vi, "viDisableEvent",
+    return onEvents(Call("viDisableEvent", vi, eventType, mechanism), vi,
                     [&](InstrumentSession &session) { return session.events().disable(eventType, mechanism); });
 }
 
 ViStatus viDiscardEvents(ViSession vi, ViEventType eventType, ViUInt16 mechanism)
 {
-    return onEvents(vi, "viDiscardEvents",
+    return onEvents(Call("viDiscardEvents", vi, eventType, mechanism), vi,
                     [&](InstrumentSession &session) { return session.events().discard(eventType, mechanism); });
 }
 
@@ -45,31 +45,34 @@ ViStatus viWaitOnEvent(ViSession vi, ViEventType inEventType, ViUInt32 timeout, 
 {
     storeIfWanted<ViEventType>(outEventType, 0);
     storeIfWanted<ViEvent>(outContext, VI_NULL);
-    return onEvents(vi, "viWaitOnEvent", [&](InstrumentSession &session) -> ViStatus {
-        Event event;
-        const ViStatus status = session.events().wait(inEventType, timeout, event);
-        if (status < VI_SUCCESS)
-            return status;
-        storeIfWanted(outEventType, event.type);
-        if (!outContext)
-            return status;
-        ViSession manager = VI_NULL;
-        session.getAttribute(VI_ATTR_RM_SESSION, &manager);
-        *outContext = Library::instance().handles.insert(std::make_shared<EventContext>(event), manager);
-        return *outContext != 0 ? status : VI_ERROR_ALLOC;
-    });
+    return onEvents(Call("viWaitOnEvent", vi, inEventType, timeout, Out{outEventType}, Out{outContext}), vi,
+                    [&](InstrumentSession &session) -> ViStatus {
+                        Event event;
+                        const ViStatus status = session.events().wait(inEventType, timeout, event);
+                        if (status < VI_SUCCESS)
+                            return status;
+                        storeIfWanted(outEventType, event.type);
+                        if (!outContext)
+                            return status;
+                        ViSession manager = VI_NULL;
+                        session.getAttribute(VI_ATTR_RM_SESSION, &manager);
+                        *outContext =
+                            Library::instance().handles.insert(std::make_shared<EventContext>(event), manager);
+                        return *outContext != 0 ? status : VI_ERROR_ALLOC;
+                    });
 }
 
 ViStatus viInstallHandler(ViSession vi, ViEventType eventType, ViHndlr handler, ViAddr userHandle)
 {
-    return onEvents(vi, "viInstallHandler", [&](InstrumentSession &session) {
-        return session.events().install(eventType, handler, userHandle);
-    });
+    return onEvents(
+        Call("viInstallHandler", vi, eventType, Address{reinterpret_cast<const void *>(handler)}, Address{userHandle}),
+        vi, [&](InstrumentSession &session) { return session.events().install(eventType, handler, userHandle); });
 }
 
 ViStatus viUninstallHandler(ViSession vi, ViEventType eventType, ViHndlr handler, ViAddr userHandle)
 {
-    return onEvents(vi, "viUninstallHandler", [&](InstrumentSession &session) {
-        return session.events().uninstall(eventType, handler, userHandle);
-    });
+    return onEvents(
+        Call("viUninstallHandler", vi, eventType, Address{reinterpret_cast<const void *>(handler)},
+             Address{userHandle}),
+        vi, [&](InstrumentSession &session) { return session.events().uninstall(eventType, handler, userHandle); });
 }

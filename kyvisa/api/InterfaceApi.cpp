@@ -1,32 +1,50 @@
-#include "kyvisa/api/Entry.h"
+#include "kyvisa/api/Call.h"
+
+#include <span>
 
 using namespace kyvisa;
 using namespace kyvisa::api;
 
 ViStatus viGpibControlREN(ViSession vi, ViUInt16 mode)
 {
-    return onInstrument(vi, "viGpibControlREN",
-                        [&](InstrumentSession &session) { return session.controlRemote(mode); });
+    return Call("viGpibControlREN", vi, mode).onInstrument(vi, [&](InstrumentSession &session) {
+        return session.controlRemote(mode);
+    });
 }
 
-ViStatus viGpibControlATN(ViSession vi, ViUInt16)
+ViStatus viGpibControlATN(ViSession vi, ViUInt16 mode)
 {
-    return unsupported(vi, "viGpibControlATN");
+    return Call("viGpibControlATN", vi, mode).onInstrument(vi, [&](InstrumentSession &session) {
+        return session.controlAttention(mode);
+    });
 }
 
 ViStatus viGpibSendIFC(ViSession vi)
 {
-    return unsupported(vi, "viGpibSendIFC");
+    return Call("viGpibSendIFC", vi).onInstrument(vi, [](InstrumentSession &session) {
+        return session.clearInterface();
+    });
 }
 
-ViStatus viGpibCommand(ViSession vi, ViConstBuf, ViUInt32, ViPUInt32)
+ViStatus viGpibCommand(ViSession vi, ViConstBuf cmd, ViUInt32 cnt, ViPUInt32 retCnt)
 {
-    return unsupported(vi, "viGpibCommand");
+    storeIfWanted<ViUInt32>(retCnt, 0);
+    return Call("viGpibCommand", vi, Bytes{cmd, cnt}, cnt, Out{retCnt})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!cmd && cnt > 0)
+                return VI_ERROR_USER_BUF;
+            std::size_t count = 0;
+            const ViStatus status = session.sendCommands(std::as_bytes(std::span(cmd, cnt)), count);
+            storeIfWanted(retCnt, static_cast<ViUInt32>(count));
+            return status;
+        });
 }
 
-ViStatus viGpibPassControl(ViSession vi, ViUInt16, ViUInt16)
+ViStatus viGpibPassControl(ViSession vi, ViUInt16 primAddr, ViUInt16 secAddr)
 {
-    return unsupported(vi, "viGpibPassControl");
+    return Call("viGpibPassControl", vi, primAddr, secAddr).onInstrument(vi, [&](InstrumentSession &session) {
+        return session.passControl(primAddr, secAddr);
+    });
 }
 
 ViStatus viVxiCommandQuery(ViSession vi, ViUInt16, ViUInt32, ViPUInt32)

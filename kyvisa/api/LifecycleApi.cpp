@@ -1,4 +1,4 @@
-#include "kyvisa/api/Entry.h"
+#include "kyvisa/api/Call.h"
 #include "kyvisa/core/FindList.h"
 
 using namespace kyvisa;
@@ -6,7 +6,7 @@ using namespace kyvisa::api;
 
 ViStatus viOpenDefaultRM(ViPSession sesn)
 {
-    return guarded([&]() -> ViStatus {
+    return Call("viOpenDefaultRM", Out{sesn}).anywhere([&]() -> ViStatus {
         if (!sesn)
             return VI_ERROR_INV_PARAMETER;
         *sesn = VI_NULL;
@@ -28,16 +28,17 @@ ViStatus viGetDefaultRM(ViPSession sesn)
 
 ViStatus viOpen(ViSession sesn, ViConstRsrc name, ViAccessMode mode, ViUInt32 timeout, ViPSession vi)
 {
-    return onResourceManager(sesn, [&](ResourceManager &manager) -> ViStatus {
-        return vi ? manager.open(name, mode, timeout, *vi) : VI_ERROR_INV_PARAMETER;
-    });
+    return Call("viOpen", sesn, name, mode, timeout, Out{vi})
+        .onResourceManager(sesn, [&](ResourceManager &manager) -> ViStatus {
+            return vi ? manager.open(name, mode, timeout, *vi) : VI_ERROR_INV_PARAMETER;
+        });
 }
 
 ViStatus viClose(ViObject vi)
 {
-    if (vi == VI_NULL)
-        return VI_WARN_NULL_OBJECT;
-    return guarded([&]() -> ViStatus {
+    return Call("viClose", vi).anywhere([&]() -> ViStatus {
+        if (vi == VI_NULL)
+            return VI_WARN_NULL_OBJECT;
         ObjectPointer object = Library::instance().handles.remove(vi);
         return object ? Object::dispose(std::move(object)) : VI_ERROR_INV_OBJECT;
     });
@@ -45,13 +46,14 @@ ViStatus viClose(ViObject vi)
 
 ViStatus viFindRsrc(ViSession sesn, ViConstString expr, ViPFindList findList, ViPUInt32 retCnt, ViChar desc[])
 {
-    return onResourceManager(
-        sesn, [&](ResourceManager &manager) { return manager.findResources(expr, findList, retCnt, desc); });
+    return Call("viFindRsrc", sesn, expr, Out{findList}, Out{retCnt}, OutText{desc})
+        .onResourceManager(
+            sesn, [&](ResourceManager &manager) { return manager.findResources(expr, findList, retCnt, desc); });
 }
 
 ViStatus viFindNext(ViFindList findList, ViChar desc[])
 {
-    return onObject(findList, [&](Object &object) -> ViStatus {
+    return Call("viFindNext", findList, OutText{desc}).on(findList, [&](Object &object) -> ViStatus {
         FindList *list = object.asFindList();
         if (!list)
             return VI_ERROR_NSUP_OPER;
@@ -67,9 +69,11 @@ ViStatus viParseRsrc(ViSession sesn, ViConstRsrc rsrcName, ViPUInt16 intfType, V
 ViStatus viParseRsrcEx(ViSession sesn, ViConstRsrc rsrcName, ViPUInt16 intfType, ViPUInt16 intfNum, ViChar rsrcClass[],
                        ViChar expandedUnaliasedName[], ViChar aliasIfExists[])
 {
-    return onResourceManager(sesn, [&](ResourceManager &manager) -> ViStatus {
-        if (!intfType || !intfNum)
-            return VI_ERROR_INV_PARAMETER;
-        return manager.parse(rsrcName, *intfType, *intfNum, rsrcClass, expandedUnaliasedName, aliasIfExists);
-    });
+    return Call("viParseRsrcEx", sesn, rsrcName, Out{intfType}, Out{intfNum}, OutText{rsrcClass},
+                OutText{expandedUnaliasedName}, OutText{aliasIfExists})
+        .onResourceManager(sesn, [&](ResourceManager &manager) -> ViStatus {
+            if (!intfType || !intfNum)
+                return VI_ERROR_INV_PARAMETER;
+            return manager.parse(rsrcName, *intfType, *intfNum, rsrcClass, expandedUnaliasedName, aliasIfExists);
+        });
 }

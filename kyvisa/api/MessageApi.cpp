@@ -1,4 +1,5 @@
-#include "kyvisa/api/Entry.h"
+#include "kyvisa/api/Call.h"
+#include "kyvisa/core/FileTransfer.h"
 
 #include <span>
 
@@ -23,75 +24,96 @@ std::span<const std::byte> bytes(ViConstBuf buf, ViUInt32 cnt)
 ViStatus viRead(ViSession vi, ViPBuf buf, ViUInt32 cnt, ViPUInt32 retCnt)
 {
     storeIfWanted<ViUInt32>(retCnt, 0);
-    return onInstrument(vi, "viRead", [&](InstrumentSession &session) -> ViStatus {
-        if (!buf && cnt > 0)
-            return VI_ERROR_USER_BUF;
-        std::size_t count = 0;
-        const ViStatus status = session.read(bytes(buf, cnt), count);
-        storeIfWanted(retCnt, static_cast<ViUInt32>(count));
-        return status;
-    });
+    return Call("viRead", vi, Received{buf, retCnt}, cnt, Out{retCnt})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!buf && cnt > 0)
+                return VI_ERROR_USER_BUF;
+            std::size_t count = 0;
+            const ViStatus status = session.read(bytes(buf, cnt), count);
+            storeIfWanted(retCnt, static_cast<ViUInt32>(count));
+            return status;
+        });
 }
 
 ViStatus viReadAsync(ViSession vi, ViPBuf buf, ViUInt32 cnt, ViPJobId jobId)
 {
-    return onInstrument(vi, "viReadAsync", [&](InstrumentSession &session) -> ViStatus {
-        if (!buf && cnt > 0)
-            return VI_ERROR_USER_BUF;
-        ViJobId job = VI_NULL;
-        const ViStatus status = session.readAsync(bytes(buf, cnt), job);
-        storeIfWanted(jobId, job);
-        return status;
-    });
+    return Call("viReadAsync", vi, Address{buf}, cnt, Out{jobId})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!buf && cnt > 0)
+                return VI_ERROR_USER_BUF;
+            ViJobId job = VI_NULL;
+            const ViStatus status = session.readAsync(bytes(buf, cnt), job);
+            storeIfWanted(jobId, job);
+            return status;
+        });
 }
 
-ViStatus viReadToFile(ViSession vi, ViConstString, ViUInt32, ViPUInt32 retCnt)
+ViStatus viReadToFile(ViSession vi, ViConstString filename, ViUInt32 cnt, ViPUInt32 retCnt)
 {
     storeIfWanted<ViUInt32>(retCnt, 0);
-    return unimplemented(vi, "viReadToFile");
+    return Call("viReadToFile", vi, filename, cnt, Out{retCnt})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!filename)
+                return VI_ERROR_FILE_ACCESS;
+            ViUInt32 count = 0;
+            const ViStatus status = readToFile(session, filename, cnt, count);
+            storeIfWanted(retCnt, count);
+            return status;
+        });
 }
 
 ViStatus viWrite(ViSession vi, ViConstBuf buf, ViUInt32 cnt, ViPUInt32 retCnt)
 {
     storeIfWanted<ViUInt32>(retCnt, 0);
-    return onInstrument(vi, "viWrite", [&](InstrumentSession &session) -> ViStatus {
-        if (!buf && cnt > 0)
-            return VI_ERROR_USER_BUF;
-        std::size_t count = 0;
-        const ViStatus status = session.write(bytes(buf, cnt), count);
-        storeIfWanted(retCnt, static_cast<ViUInt32>(count));
-        return status;
-    });
+    return Call("viWrite", vi, Bytes{buf, cnt}, cnt, Out{retCnt})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!buf && cnt > 0)
+                return VI_ERROR_USER_BUF;
+            std::size_t count = 0;
+            const ViStatus status = session.write(bytes(buf, cnt), count);
+            storeIfWanted(retCnt, static_cast<ViUInt32>(count));
+            return status;
+        });
 }
 
 ViStatus viWriteAsync(ViSession vi, ViConstBuf buf, ViUInt32 cnt, ViPJobId jobId)
 {
-    return onInstrument(vi, "viWriteAsync", [&](InstrumentSession &session) -> ViStatus {
-        if (!buf && cnt > 0)
-            return VI_ERROR_USER_BUF;
-        ViJobId job = VI_NULL;
-        const ViStatus status = session.writeAsync(bytes(buf, cnt), job);
-        storeIfWanted(jobId, job);
-        return status;
-    });
+    return Call("viWriteAsync", vi, Bytes{buf, cnt}, cnt, Out{jobId})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!buf && cnt > 0)
+                return VI_ERROR_USER_BUF;
+            ViJobId job = VI_NULL;
+            const ViStatus status = session.writeAsync(bytes(buf, cnt), job);
+            storeIfWanted(jobId, job);
+            return status;
+        });
 }
 
-ViStatus viWriteFromFile(ViSession vi, ViConstString, ViUInt32, ViPUInt32 retCnt)
+ViStatus viWriteFromFile(ViSession vi, ViConstString filename, ViUInt32 cnt, ViPUInt32 retCnt)
 {
     storeIfWanted<ViUInt32>(retCnt, 0);
-    return unimplemented(vi, "viWriteFromFile");
+    return Call("viWriteFromFile", vi, filename, cnt, Out{retCnt})
+        .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+            if (!filename)
+                return VI_ERROR_FILE_ACCESS;
+            ViUInt32 count = 0;
+            const ViStatus status = writeFromFile(session, filename, cnt, count);
+            storeIfWanted(retCnt, count);
+            return status;
+        });
 }
 
 ViStatus viAssertTrigger(ViSession vi, ViUInt16 protocol)
 {
-    return onInstrument(vi, "viAssertTrigger",
-                        [&](InstrumentSession &session) { return session.assertTrigger(protocol); });
+    return Call("viAssertTrigger", vi, protocol).onInstrument(vi, [&](InstrumentSession &session) {
+        return session.assertTrigger(protocol);
+    });
 }
 
 ViStatus viReadSTB(ViSession vi, ViPUInt16 status)
 {
     storeIfWanted<ViUInt16>(status, 0);
-    return onInstrument(vi, "viReadSTB", [&](InstrumentSession &session) {
+    return Call("viReadSTB", vi, Out{status}).onInstrument(vi, [&](InstrumentSession &session) {
         ViUInt16 byte = 0;
         const ViStatus result = session.readStatusByte(byte);
         storeIfWanted(status, byte);
@@ -101,27 +123,5 @@ ViStatus viReadSTB(ViSession vi, ViPUInt16 status)
 
 ViStatus viClear(ViSession vi)
 {
-    return onInstrument(vi, "viClear", [](InstrumentSession &session) { return session.clear(); });
-}
-
-ViStatus viSetBuf(ViSession vi, ViUInt16, ViUInt32)
-{
-    return unimplemented(vi, "viSetBuf");
-}
-
-ViStatus viFlush(ViSession vi, ViUInt16)
-{
-    return unimplemented(vi, "viFlush");
-}
-
-ViStatus viBufWrite(ViSession vi, ViConstBuf, ViUInt32, ViPUInt32 retCnt)
-{
-    storeIfWanted<ViUInt32>(retCnt, 0);
-    return unimplemented(vi, "viBufWrite");
-}
-
-ViStatus viBufRead(ViSession vi, ViPBuf, ViUInt32, ViPUInt32 retCnt)
-{
-    storeIfWanted<ViUInt32>(retCnt, 0);
-    return unimplemented(vi, "viBufRead");
+    return Call("viClear", vi).onInstrument(vi, [](InstrumentSession &session) { return session.clear(); });
 }

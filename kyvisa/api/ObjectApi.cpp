@@ -1,4 +1,4 @@
-#include "kyvisa/api/Entry.h"
+#include "kyvisa/api/Call.h"
 #include "kyvisa/core/StatusText.h"
 
 #include <cstdio>
@@ -9,12 +9,14 @@ using namespace kyvisa::api;
 
 ViStatus viGetAttribute(ViObject vi, ViAttr attrName, void *attrValue)
 {
-    return onObject(vi, [&](Object &object) { return object.getAttribute(attrName, attrValue); });
+    return Call("viGetAttribute", vi, attrName, Address{attrValue}).on(vi, [&](Object &object) {
+        return object.getAttribute(attrName, attrValue);
+    });
 }
 
 ViStatus viSetAttribute(ViObject vi, ViAttr attrName, ViAttrState attrValue)
 {
-    return onObject(vi, [&](Object &object) {
+    return Call("viSetAttribute", vi, attrName, attrValue).on(vi, [&](Object &object) {
         const ViStatus status = object.setAttribute(attrName, attrValue);
         InstrumentSession *session = object.asInstrument();
         return session ? reported(*session, "viSetAttribute", status) : status;
@@ -22,32 +24,35 @@ ViStatus viSetAttribute(ViObject vi, ViAttr attrName, ViAttrState attrValue)
 }
 
 // The handle is not looked at: a program asks what went wrong also when it has no session.
-ViStatus viStatusDesc(ViObject, ViStatus status, ViChar desc[])
+ViStatus viStatusDesc(ViObject vi, ViStatus status, ViChar desc[])
 {
-    if (!desc)
-        return VI_ERROR_INV_PARAMETER;
-    if (const char *text = statusText(status)) {
-        std::strcpy(desc, text);
-        return VI_SUCCESS;
-    }
-    std::snprintf(desc, MaxAttributeText, "Unknown status 0x%08X.", static_cast<unsigned>(status));
-    return VI_WARN_UNKNOWN_STATUS;
+    return Call("viStatusDesc", vi, status, OutText{desc}).anywhere([&]() -> ViStatus {
+        if (!desc)
+            return VI_ERROR_INV_PARAMETER;
+        if (const char *text = statusText(status)) {
+            std::strcpy(desc, text);
+            return VI_SUCCESS;
+        }
+        std::snprintf(desc, MaxAttributeText, "Unknown status 0x%08X.", static_cast<unsigned>(status));
+        return VI_WARN_UNKNOWN_STATUS;
+    });
 }
 
 ViStatus viTerminate(ViObject vi, ViUInt16 degree, ViJobId jobId)
 {
-    return onInstrument(vi, "viTerminate",
-                        [&](InstrumentSession &session) { return session.terminate(degree, jobId); });
+    return Call("viTerminate", vi, degree, jobId).onInstrument(vi, [&](InstrumentSession &session) {
+        return session.terminate(degree, jobId);
+    });
 }
 
 ViStatus viLock(ViSession vi, ViAccessMode lockType, ViUInt32 timeout, ViConstKeyId requestedKey, ViChar accessKey[])
 {
-    return onInstrument(vi, "viLock", [&](InstrumentSession &session) {
-        return session.lock(lockType, timeout, requestedKey, accessKey);
-    });
+    return Call("viLock", vi, lockType, timeout, requestedKey, OutText{accessKey})
+        .onInstrument(
+            vi, [&](InstrumentSession &session) { return session.lock(lockType, timeout, requestedKey, accessKey); });
 }
 
 ViStatus viUnlock(ViSession vi)
 {
-    return onInstrument(vi, "viUnlock", [](InstrumentSession &session) { return session.unlock(); });
+    return Call("viUnlock", vi).onInstrument(vi, [](InstrumentSession &session) { return session.unlock(); });
 }

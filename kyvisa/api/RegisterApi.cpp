@@ -1,4 +1,4 @@
-#include "kyvisa/api/Entry.h"
+#include "kyvisa/api/Call.h"
 
 using namespace kyvisa;
 using namespace kyvisa::api;

@@ -2,6 +2,7 @@
 
 #include "kyvisa/include/visa.h"
 #include "kyvisa/os/Deadline.h"
+#include "kyvisa/os/Thread.h"
 
 #include <algorithm>
 #include <chrono>
@@ -198,10 +199,14 @@ ViStatus EventHub::wait(ViEventType type, ViUInt32 timeout, Event &event)
     std::unique_lock lock(m_mutex);
     if (!stateOf(type) && type != VI_ALL_ENABLED_EVENTS)
         return VI_ERROR_INV_EVENT;
-    const bool ended = os::waitUntil(m_changed, lock, deadline,
-                                     [&] { return m_closed || isQueued(type) || !anyEnabled(type, VI_QUEUE); });
+    const unsigned before = m_terminations;
+    const bool ended = os::waitUntil(m_changed, lock, deadline, [&] {
+        return m_closed || isQueued(type) || !anyEnabled(type, VI_QUEUE) || m_terminations != before;
+    });
     if (m_closed)
         return VI_ERROR_INV_OBJECT;
+    if (m_terminations != before && !isQueued(type))
+        return VI_ERROR_ABORT;
     if (!ended)
         return VI_ERROR_TMO;
     if (!takeQueued(type, event))
@@ -285,7 +290,7 @@ bool EventHub::startHandlerThread()
     if (m_handlerThreadStarted)
         return true;
     try {
-        std::thread([self = shared_from_this()] { self->runHandlers(); }).detach();
+        os::startThread([self = shared_from_this()] { self->runHandlers(); }).detach();
     } catch (const std::system_error &) {
         return false;
     }
@@ -331,6 +336,13 @@ void EventHub::callHandlers(const Event &event)
         if (handler->function(m_session, event.type, context, handler->userHandle) == VI_SUCCESS_NCHAIN)
             break;
     m_contexts.close(context);
+}
+
+void EventHub::terminate()
+{
+    const std::lock_guard lock(m_mutex);
+    ++m_terminations;
+    m_changed.notify_all();
 }
 
 void EventHub::close()

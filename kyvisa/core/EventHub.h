@@ -57,6 +57,8 @@ public:
     /// False once something was enabled: the length of the queue is fixed from then on.
     bool setQueueLength(ViUInt32 length);
 
+    /// Ends the waits that are going on with VI_ERROR_ABORT.
+    void terminate();
     /// Wakes who waits, drops what is queued. A handler that is running is given five seconds to return, unless the
     /// caller is that handler.
     void close();
@@ -95,6 +97,7 @@ private:
     ViUInt32 m_queueLength = 50;
     bool m_everEnabled = false;
     bool m_closed = false;
+    unsigned m_terminations = 0;
     Queue m_queue;
     Queue m_suspended;
     Queue m_forHandlers;

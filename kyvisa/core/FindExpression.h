@@ -1,20 +1,37 @@
 #pragma once
 
+#include "kyvisa/core/AttributeCondition.h"
+#include "kyvisa/core/ResourcePattern.h"
+
+#include <optional>
 #include <string_view>
 
 namespace kyvisa
 {
 
 /**
- * The search expression of viFindRsrc: a regular expression over resource strings (VPP-4.3: `?` `\` `[ ]` `[^ ]` `*` `+`
- * `|` `( )`), optionally followed by an attribute condition in braces.
- *
- * Only global attributes may stand in the condition.
+ * The search expression of viFindRsrc: a regular expression over resource strings, optionally followed by an attribute
+ * condition in braces, such as `ASRL?*INSTR{VI_ATTR_ASRL_BAUD == 9600}`.
  */
 class FindExpression
 {
 public:
-    static bool isValid(std::string_view text);
+    /// Nothing when @p text is not valid.
+    static std::optional<FindExpression> parse(std::string_view text);
+
+    /// @param resource a canonical resource string.
+    bool matches(std::string_view resource) const;
+    /// Whether some resource whose name begins like this could match.
+    bool mayMatch(std::string_view beginning) const { return m_pattern.mayMatch(beginning); }
+
+private:
+    FindExpression(ResourcePattern pattern, std::optional<AttributeCondition> condition)
+        : m_pattern(std::move(pattern)), m_condition(std::move(condition))
+    {
+    }
+
+    ResourcePattern m_pattern;
+    std::optional<AttributeCondition> m_condition;
 };
 
 } // namespace kyvisa

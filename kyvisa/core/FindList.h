@@ -2,9 +2,9 @@
 
 #include "kyvisa/core/AttributeStore.h"
 #include "kyvisa/core/Object.h"
+#include "kyvisa/discovery/FoundResource.h"
 
 #include <mutex>
-#include <string>
 #include <vector>
 
 namespace kyvisa
@@ -14,11 +14,9 @@ namespace kyvisa
 class FindList : public Object
 {
 public:
-    /// @param names at least one; the first is the current one.
-    explicit FindList(std::vector<std::string> names);
+    /// @param found at least one; the first is the current one.
+    explicit FindList(std::vector<FoundResource> found);
 
-    const std::string &first() const { return m_names.front(); }
-    std::size_t size() const { return m_names.size(); }
     /// Copies the next name, at most VI_FIND_BUFLEN bytes with its NUL. RSRC_NFOUND behind the last.
     ViStatus next(ViChar *name);
 
@@ -29,7 +27,7 @@ public:
 
 private:
     AttributeStore m_attributes;
-    std::vector<std::string> m_names;
+    const std::vector<FoundResource> m_found;
     std::mutex m_mutex;
     std::size_t m_current = 0;
 };

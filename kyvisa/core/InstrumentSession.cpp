@@ -2,9 +2,11 @@
 
 #include "kyvisa/core/EventContext.h"
 #include "kyvisa/core/Library.h"
+#include "kyvisa/core/ResourceDescription.h"
 #include "kyvisa/core/ResourceLocks.h"
 #include "kyvisa/include/visa.h"
 #include "kyvisa/os/WaitLimit.h"
+#include "kyvisa/transport/GpibController.h"
 #include "kyvisa/transport/Transport.h"
 #include "kyvisa/transport/TransportFactory.h"
 
@@ -16,16 +18,15 @@ namespace kyvisa
 namespace
 {
 
-constexpr ViUInt32 DefaultOpenTimeout = 2000;
 constexpr std::size_t MaxAccessKey = 256;
 
 constexpr std::array<ViEventType, 3> InstrumentEvents = {VI_EVENT_IO_COMPLETION, VI_EVENT_EXCEPTION,
                                                          VI_EVENT_SERVICE_REQ};
 
-/// A raw socket has no way to ask for service.
+/// A raw socket and a serial port have no way to ask for service.
 std::span<const ViEventType> possibleEvents(std::uint16_t sessionKind)
 {
-    return std::span(InstrumentEvents).first(sessionKind == kind::Socket ? 2 : 3);
+    return std::span(InstrumentEvents).first((sessionKind & (kind::Socket | kind::Serial)) != 0 ? 2 : 3);
 }
 
 EventHub::Contexts contextsIn(Library &library, ViSession resourceManager)
@@ -36,47 +37,25 @@ EventHub::Contexts contextsIn(Library &library, ViSession resourceManager)
             [&library](ViEvent context) { library.handles.remove(context); }};
 }
 
-/// Leaves the gate when the operation is over, also by an exception.
-class Turn
-{
-public:
-    explicit Turn(IoGate &gate) : m_gate(gate) {}
-    ~Turn() { m_gate.leave(); }
-    Turn(const Turn &) = delete;
-    Turn &operator=(const Turn &) = delete;
-
-private:
-    IoGate &m_gate;
-};
-
 } // namespace
 
 InstrumentSession::InstrumentSession(Library &library, const ResourceName &name, std::uint16_t sessionKind,
                                      ViSession resourceManager)
-    : m_name(name), m_attributes(sessionKind), m_locks(library.locks.locksOf(name.canonical())),
+    : m_name(name), m_attributes(sessionKind),
+      m_locks(library.locks.locksOf(lockName(name)), m_interruptions,
+              [this](os::Deadline enterBy, const SessionLocks::DeviceCall &call) {
+                  return inTurn(enterBy, CallWatch(m_interruptions),
+                                [&](const os::WaitLimit &limit) { return call(*m_transport, limit.wakeup); });
+              }),
       m_events(std::make_shared<EventHub>(possibleEvents(sessionKind), contextsIn(library, resourceManager)))
 {
-    describe(name, resourceManager);
+    describeResource(name, m_attributes);
+    m_attributes.setNumber(VI_ATTR_RM_SESSION, resourceManager);
 }
 
 InstrumentSession::~InstrumentSession() = default;
 
-void InstrumentSession::describe(const ResourceName &name, ViSession resourceManager)
-{
-    m_attributes.setText(VI_ATTR_RSRC_NAME, name.canonical());
-    m_attributes.setText(VI_ATTR_RSRC_CLASS, name.className());
-    m_attributes.setText(VI_ATTR_RSRC_MANF_NAME, "Oltrava");
-    m_attributes.setNumber(VI_ATTR_RM_SESSION, resourceManager);
-    m_attributes.setNumber(VI_ATTR_INTF_TYPE, name.interfaceType);
-    m_attributes.setNumber(VI_ATTR_INTF_NUM, name.board);
-    m_attributes.setText(VI_ATTR_TCPIP_HOSTNAME, name.host);
-    m_attributes.setText(VI_ATTR_TCPIP_DEVICE_NAME, name.deviceName);
-    m_attributes.setNumber(VI_ATTR_TCPIP_PORT, name.port);
-    m_attributes.setNumber(VI_ATTR_TCPIP_IS_HISLIP, name.isHislip() ? VI_TRUE : VI_FALSE);
-    m_attributes.setText(VI_ATTR_INTF_INST_NAME, "TCPIP" + std::to_string(name.board) + " (" + name.host + ")");
-}
-
-ViStatus InstrumentSession::open(ViSession handle, ViAccessMode accessMode, ViUInt32 timeout)
+ViStatus InstrumentSession::open(ViSession handle, ViAccessMode accessMode, ViUInt32 timeout, os::Deadline connectBy)
 {
     if (!m_wakeup.valid())
         return VI_ERROR_ALLOC;
@@ -85,16 +64,18 @@ ViStatus InstrumentSession::open(ViSession handle, ViAccessMode accessMode, ViUI
     {
         if (m_gate.enter(deadline) != IoGate::Entered::Yes)
             return VI_ERROR_INV_OBJECT;
-        const Turn turn(m_gate);
-        const ViStatus status = openTransport(m_name, {deadline, m_wakeup}, m_attributes, m_transport);
+        const GateTurn turn(m_gate);
+        const ViStatus status =
+            openTransport(m_name, {deadline.orEarlier(connectBy), m_wakeup}, m_attributes, m_transport);
         if (status < VI_SUCCESS)
             return status;
+        m_locks.setDevice(m_transport->deviceLocks());
         m_opened.store(true);
     }
     if ((accessMode & VI_EXCLUSIVE_LOCK) != 0) {
         std::string key;
         const ViUInt32 left = timeout == VI_TMO_IMMEDIATE ? timeout : deadline.visaTimeoutLeft();
-        const ViStatus locked = m_locks->lock(this, VI_EXCLUSIVE_LOCK, left, {}, m_closing, key);
+        const ViStatus locked = m_locks.lock(VI_EXCLUSIVE_LOCK, left, {}, key);
         // The caller asked for a resource and a lock at once: the lock, not the connection, is what was not to be had.
         if (locked == VI_ERROR_TMO)
             return VI_ERROR_RSRC_LOCKED;
@@ -104,25 +85,16 @@ ViStatus InstrumentSession::open(ViSession handle, ViAccessMode accessMode, ViUI
     return (accessMode & VI_LOAD_CONFIG) != 0 ? VI_WARN_CONFIG_NLOADED : VI_SUCCESS;
 }
 
-ViStatus InstrumentSession::mayTransfer(os::Deadline deadline)
+ViStatus InstrumentSession::mayTransfer()
 {
     if (inherited())
         return VI_ERROR_CONN_LOST;
     if (!m_opened.load())
         return VI_ERROR_INV_OBJECT;
-    if (!m_locks->heldByOther(this))
-        return VI_SUCCESS;
-    const unsigned before = m_terminations.load();
-    const auto terminated = [&] { return m_terminations.load() != before; };
-    if (m_transport->deviceHasLocks() &&
-        m_locks->awaitAccess(this, deadline, [&] { return m_closing.load() || terminated(); }))
-        return VI_SUCCESS;
-    if (terminated() && !m_closing.load())
-        return VI_ERROR_ABORT;
-    return m_closing.load() ? VI_ERROR_INV_OBJECT : VI_ERROR_RSRC_LOCKED;
+    return m_locks.shutOut() ? VI_ERROR_RSRC_LOCKED : VI_SUCCESS;
 }
 
-ViStatus InstrumentSession::enterGate(os::Deadline deadline)
+ViStatus InstrumentSession::enterGate(os::Deadline deadline, const CallWatch &watch)
 {
     switch (m_gate.enter(deadline)) {
     case IoGate::Entered::TimedOut:
@@ -132,26 +104,35 @@ ViStatus InstrumentSession::enterGate(os::Deadline deadline)
     case IoGate::Entered::Yes:
         break;
     }
+    // A viTerminate that comes from here on finds the wake-up armed; one that came while this call waited is in the watch.
     m_wakeup.rearm();
+    if (watch.interrupted()) {
+        m_gate.leave();
+        return watch.status();
+    }
     return VI_SUCCESS;
 }
 
-template <typename Operation>
-ViStatus InstrumentSession::perform(const Operation &operation)
+os::Deadline InstrumentSession::operationDeadline() const
 {
-    const auto timeout = static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE));
-    const auto deadline = os::Deadline::afterVisaTimeout(timeout);
-    const ViStatus status = mayTransfer(deadline);
-    return status == VI_SUCCESS ? inTurn(deadline, operation) : status;
+    return os::Deadline::afterVisaTimeout(static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE)));
 }
 
 template <typename Operation>
-ViStatus InstrumentSession::inTurn(os::Deadline deadline, const Operation &operation)
+ViStatus InstrumentSession::perform(os::Deadline deadline, const Operation &operation)
 {
-    const ViStatus entered = enterGate(deadline);
+    const CallWatch watch(m_interruptions);
+    const ViStatus status = mayTransfer();
+    return status == VI_SUCCESS ? inTurn(deadline, watch, operation) : status;
+}
+
+template <typename Operation>
+ViStatus InstrumentSession::inTurn(os::Deadline deadline, const CallWatch &watch, const Operation &operation)
+{
+    const ViStatus entered = enterGate(deadline, watch);
     if (entered != VI_SUCCESS)
         return entered;
-    const Turn turn(m_gate);
+    const GateTurn turn(m_gate);
     return operation({deadline, m_wakeup});
 }
 
@@ -168,17 +149,30 @@ TransferMode InstrumentSession::transferMode() const
 
 ViStatus InstrumentSession::read(std::span<std::byte> buffer, std::size_t &count)
 {
+    return read(buffer, count, operationDeadline());
+}
+
+ViStatus InstrumentSession::read(std::span<std::byte> buffer, std::size_t &count, os::Deadline deadline)
+{
     count = 0;
     if (buffer.empty())
         return VI_SUCCESS_MAX_CNT;
-    return perform([&](const os::WaitLimit &limit) { return m_transport->read(buffer, transferMode(), limit, count); });
+    return perform(deadline,
+                   [&](const os::WaitLimit &limit) { return m_transport->read(buffer, transferMode(), limit, count); });
 }
 
 ViStatus InstrumentSession::write(std::span<const std::byte> data, std::size_t &count)
 {
+    return write(data, count, operationDeadline(), true);
+}
+
+ViStatus InstrumentSession::write(std::span<const std::byte> data, std::size_t &count, os::Deadline deadline, bool end)
+{
     count = 0;
-    return perform([&](const os::WaitLimit &limit) {
-        return data.empty() ? VI_SUCCESS : m_transport->write(data, transferMode(), limit, count);
+    return perform(deadline, [&](const os::WaitLimit &limit) {
+        TransferMode mode = transferMode();
+        mode.sendEnd = mode.sendEnd && end;
+        return data.empty() ? VI_SUCCESS : m_transport->write(data, mode, limit, count);
     });
 }
 
@@ -207,29 +201,89 @@ ViStatus InstrumentSession::writeAsync(std::span<const std::byte> data, ViJobId 
 
 ViStatus InstrumentSession::readStatusByte(ViUInt16 &status)
 {
-    return perform(
-        [&](const os::WaitLimit &limit) { return m_transport->readStatusByte(transferMode(), limit, status); });
+    if (isInterface())
+        return VI_ERROR_NSUP_OPER;
+    return perform(operationDeadline(), [&](const os::WaitLimit &limit) {
+        return m_transport->readStatusByte(transferMode(), limit, status);
+    });
 }
 
 ViStatus InstrumentSession::assertTrigger(ViUInt16 protocol)
 {
     if (protocol != VI_TRIG_PROT_DEFAULT)
         return VI_ERROR_INV_PROT;
-    return perform([&](const os::WaitLimit &limit) { return m_transport->trigger(transferMode(), limit); });
+    return perform(operationDeadline(),
+                   [&](const os::WaitLimit &limit) { return m_transport->trigger(transferMode(), limit); });
 }
 
 ViStatus InstrumentSession::clear()
 {
-    return perform([&](const os::WaitLimit &limit) { return m_transport->clear(limit); });
+    if (isInterface())
+        return VI_ERROR_NSUP_OPER;
+    m_formatted.forget();
+    return perform(operationDeadline(), [&](const os::WaitLimit &limit) { return m_transport->clear(limit); });
 }
 
 ViStatus InstrumentSession::controlRemote(ViUInt16 mode)
 {
-    if (m_attributes.kind() == kind::Socket)
+    if ((m_attributes.kind() & (kind::Socket | kind::Serial)) != 0)
         return VI_ERROR_NSUP_OPER;
     if (mode > VI_GPIB_REN_ADDRESS_GTL)
         return VI_ERROR_INV_MODE;
-    return perform([&](const os::WaitLimit &limit) { return m_transport->controlRemote(mode, limit); });
+    return perform(operationDeadline(),
+                   [&](const os::WaitLimit &limit) { return m_transport->controlRemote(mode, limit); });
+}
+
+bool InstrumentSession::isInterface() const
+{
+    return m_attributes.kind() == kind::GpibIntfc;
+}
+
+ViStatus InstrumentSession::controlAttention(ViUInt16 mode)
+{
+    if (!isInterface())
+        return VI_ERROR_NSUP_OPER;
+    if (mode > VI_GPIB_ATN_ASSERT_IMMEDIATE)
+        return VI_ERROR_INV_MODE;
+    return perform(operationDeadline(), [&](const os::WaitLimit &limit) {
+        return m_transport->gpibController()->controlAttention(mode, limit);
+    });
+}
+
+ViStatus InstrumentSession::clearInterface()
+{
+    if (!isInterface())
+        return VI_ERROR_NSUP_OPER;
+    return perform(operationDeadline(),
+                   [&](const os::WaitLimit &limit) { return m_transport->gpibController()->clearInterface(limit); });
+}
+
+ViStatus InstrumentSession::sendCommands(std::span<const std::byte> commands, std::size_t &count)
+{
+    count = 0;
+    if (!isInterface())
+        return VI_ERROR_NSUP_OPER;
+    return perform(operationDeadline(), [&](const os::WaitLimit &limit) {
+        return m_transport->gpibController()->sendCommands(commands, limit, count);
+    });
+}
+
+ViStatus InstrumentSession::passControl(ViUInt16 primary, ViUInt16 secondary)
+{
+    constexpr ViUInt16 LastAddress = 30;
+    if (!isInterface())
+        return VI_ERROR_NSUP_OPER;
+    if (primary > LastAddress || (secondary > LastAddress && secondary != VI_NO_SEC_ADDR))
+        return VI_ERROR_INV_PARAMETER;
+    return perform(operationDeadline(), [&](const os::WaitLimit &limit) {
+        return m_transport->gpibController()->passControl(primary, secondary, limit);
+    });
+}
+
+ViStatus InstrumentSession::flushLine(ViUInt16 mask)
+{
+    return perform(operationDeadline(),
+                   [&](const os::WaitLimit &limit) { return m_transport->flushLine(mask, limit); });
 }
 
 ViStatus InstrumentSession::terminate(ViUInt16 degree, ViJobId job)
@@ -240,9 +294,10 @@ ViStatus InstrumentSession::terminate(ViUInt16 degree, ViJobId job)
         return VI_ERROR_INV_JOB_ID;
     if (inherited())
         return VI_ERROR_CONN_LOST;
-    ++m_terminations;
+    ++m_interruptions.terminations;
     m_wakeup.terminate();
-    m_locks->wake();
+    m_locks.wake();
+    m_events->terminate();
     return VI_SUCCESS;
 }
 
@@ -252,6 +307,8 @@ ViStatus InstrumentSession::lock(ViAccessMode type, ViUInt32 timeout, const ViCh
         return VI_ERROR_INV_LOCK_TYPE;
     if (inherited())
         return VI_ERROR_CONN_LOST;
+    if (!m_opened.load())
+        return VI_ERROR_INV_OBJECT;
     std::string requested;
     if (type == VI_SHARED_LOCK && requestedKey) {
         requested.assign(requestedKey, ::strnlen(requestedKey, MaxAccessKey));
@@ -259,7 +316,7 @@ ViStatus InstrumentSession::lock(ViAccessMode type, ViUInt32 timeout, const ViCh
             return VI_ERROR_INV_ACCESS_KEY;
     }
     std::string granted;
-    const ViStatus status = m_locks->lock(this, type, timeout, requested, m_closing, granted);
+    const ViStatus status = m_locks.lock(type, timeout, requested, granted);
     if (status >= VI_SUCCESS && accessKey)
         std::memcpy(accessKey, granted.c_str(), granted.size() + 1);
     return status;
@@ -267,7 +324,7 @@ ViStatus InstrumentSession::lock(ViAccessMode type, ViUInt32 timeout, const ViCh
 
 ViStatus InstrumentSession::unlock()
 {
-    return inherited() ? VI_ERROR_CONN_LOST : m_locks->unlock(this);
+    return inherited() ? VI_ERROR_CONN_LOST : m_locks.unlock();
 }
 
 ViStatus InstrumentSession::enableEvent(ViEventType type, ViUInt16 mechanism, ViEventFilter filter)
@@ -278,17 +335,18 @@ ViStatus InstrumentSession::enableEvent(ViEventType type, ViUInt16 mechanism, Vi
     if (status < VI_SUCCESS || type != VI_EVENT_SERVICE_REQ)
         return status;
     // Events ignore locks, so this takes the turn without asking for them.
-    const ViStatus entered =
-        enterGate(os::Deadline::afterVisaTimeout(static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE))));
+    const auto deadline = os::Deadline::afterVisaTimeout(static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE)));
+    const ViStatus entered = enterGate(deadline, CallWatch(m_interruptions));
     if (entered != VI_SUCCESS) {
         m_events->disable(type, VI_ALL_MECH);
         return entered;
     }
-    const Turn turn(m_gate);
-    const ViStatus watching = m_transport->watchServiceRequests([events = std::weak_ptr(m_events)] {
+    const GateTurn turn(m_gate);
+    const auto notify = [events = std::weak_ptr(m_events)] {
         if (const auto hub = events.lock())
             hub->post({.type = VI_EVENT_SERVICE_REQ});
-    });
+    };
+    const ViStatus watching = m_transport->watchServiceRequests(notify, {deadline, m_wakeup});
     if (watching < VI_SUCCESS)
         m_events->disable(type, VI_ALL_MECH);
     return watching < VI_SUCCESS ? watching : status;
@@ -296,10 +354,19 @@ ViStatus InstrumentSession::enableEvent(ViEventType type, ViUInt16 mechanism, Vi
 
 ViStatus InstrumentSession::getAttribute(ViAttr attribute, void *value)
 {
-    if (attribute == VI_ATTR_RSRC_LOCK_STATE && value && !inherited()) {
-        const ViAccessMode state = m_locks->state();
+    if (attribute == VI_ATTR_RSRC_LOCK_STATE && value && !inherited() && m_opened.load()) {
+        const ViAccessMode state = m_locks.state();
         std::memcpy(value, &state, sizeof state);
         return VI_SUCCESS;
+    }
+    if (value && !inherited() && m_opened.load() && m_transport->isLive(attribute)) {
+        ViUInt64 number = 0;
+        const ViStatus status =
+            inTurn(operationDeadline(), CallWatch(m_interruptions),
+                   [&](const os::WaitLimit &limit) { return m_transport->readAttribute(attribute, limit, number); });
+        if (status < VI_SUCCESS)
+            return status;
+        m_attributes.setNumber(attribute, number);
     }
     return m_attributes.get(attribute, value);
 }
@@ -309,28 +376,52 @@ ViStatus InstrumentSession::setAttribute(ViAttr attribute, ViAttrState state)
     const AttributeRow *row;
     std::int64_t value;
     const ViStatus status = m_attributes.check(attribute, state, row, value);
+    if (attribute == VI_ATTR_IO_PROT && state == VI_PROT_HS488 && m_attributes.kind() == kind::GpibInstr)
+        return VI_WARN_NSUP_ATTR_STATE; // a wish that a bus without it may leave open
     if (status < VI_SUCCESS)
         return status;
-    if (row->scope == Scope::Global && m_locks->heldByOther(this))
+    const bool address = attribute == VI_ATTR_GPIB_PRIMARY_ADDR || attribute == VI_ATTR_GPIB_SECONDARY_ADDR;
+    if (address && !isInterface())
+        return VI_ERROR_ATTR_READONLY; // an instrument's is part of its name
+    if (row->scope == Scope::Global && m_locks.shutOut())
         return VI_ERROR_RSRC_LOCKED;
     switch (attribute) {
+    case VI_ATTR_GPIB_SECONDARY_ADDR: // the gateway can give the interface neither
+        return value == VI_NO_SEC_ADDR ? VI_SUCCESS : VI_ERROR_NSUP_ATTR_STATE;
+    case VI_ATTR_DEV_STATUS_BYTE:
+        return value == 0 ? VI_SUCCESS : VI_ERROR_NSUP_ATTR_STATE;
     case VI_ATTR_MAX_QUEUE_LENGTH:
         if (!m_events->setQueueLength(static_cast<ViUInt32>(value)))
             return VI_ERROR_ATTR_READONLY;
         break;
     case VI_ATTR_DMA_ALLOW_EN:
         return value == VI_TRUE ? VI_WARN_NSUP_ATTR_STATE : VI_SUCCESS;
+    case VI_ATTR_GPIB_PRIMARY_ADDR:
+    case VI_ATTR_GPIB_UNADDR_EN:
     case VI_ATTR_TCPIP_NODELAY:
     case VI_ATTR_TCPIP_KEEPALIVE:
     case VI_ATTR_TCPIP_HISLIP_MAX_MESSAGE_KB:
-    case VI_ATTR_TCPIP_HISLIP_OVERLAP_EN: {
+    case VI_ATTR_TCPIP_HISLIP_OVERLAP_EN:
+    case VI_ATTR_ASRL_BAUD:
+    case VI_ATTR_ASRL_DATA_BITS:
+    case VI_ATTR_ASRL_PARITY:
+    case VI_ATTR_ASRL_STOP_BITS:
+    case VI_ATTR_ASRL_FLOW_CNTRL:
+    case VI_ATTR_ASRL_END_IN:
+    case VI_ATTR_ASRL_END_OUT:
+    case VI_ATTR_ASRL_REPLACE_CHAR:
+    case VI_ATTR_ASRL_XON_CHAR:
+    case VI_ATTR_ASRL_XOFF_CHAR:
+    case VI_ATTR_ASRL_DTR_STATE:
+    case VI_ATTR_ASRL_RTS_STATE: {
         if (inherited())
             return VI_ERROR_CONN_LOST;
         // Local attributes ignore the locks of others, so this takes the turn without asking for them.
         const auto timeout = static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE));
-        const ViStatus applied = inTurn(os::Deadline::afterVisaTimeout(timeout), [&](const os::WaitLimit &limit) {
-            return m_transport->applyAttribute(attribute, static_cast<ViUInt64>(value), limit);
-        });
+        const ViStatus applied = inTurn(
+            os::Deadline::afterVisaTimeout(timeout), CallWatch(m_interruptions), [&](const os::WaitLimit &limit) {
+                return m_transport->applyAttribute(attribute, static_cast<ViUInt64>(value), limit);
+            });
         if (applied != VI_SUCCESS)
             return applied;
         break;
@@ -344,15 +435,16 @@ ViStatus InstrumentSession::setAttribute(ViAttr attribute, ViAttrState state)
 
 ViStatus InstrumentSession::close()
 {
-    m_closing.store(true);
+    m_interruptions.closing.store(true);
     m_wakeup.close();
     m_gate.close();
-    m_locks->wake();
+    m_formatted.close();
+    m_locks.wake();
     m_events->close();
     m_gate.awaitEmpty();
     if (m_transport)
         m_transport->close();
-    m_locks->forget(this);
+    m_locks.close();
     return VI_SUCCESS;
 }
 

@@ -2,9 +2,12 @@
 
 #include "kyvisa/core/AttributeStore.h"
 #include "kyvisa/core/EventHub.h"
+#include "kyvisa/core/FormattedIo.h"
+#include "kyvisa/core/Interruptions.h"
 #include "kyvisa/core/IoGate.h"
 #include "kyvisa/core/Object.h"
 #include "kyvisa/core/ResourceName.h"
+#include "kyvisa/core/SessionLocks.h"
 #include "kyvisa/os/Wakeup.h"
 
 #include <atomic>
@@ -15,8 +18,10 @@
 namespace kyvisa
 {
 
+/// Of viOpen with a time-out of 0, in milliseconds.
+constexpr ViUInt32 DefaultOpenTimeout = 2000;
+
 class Library;
-class ResourceLocks;
 class Transport;
 struct TransferMode;
 namespace os
@@ -41,10 +46,24 @@ public:
     ~InstrumentSession() override;
 
     /// Connects, then takes an exclusive lock when @p accessMode asks for it.
-    ViStatus open(ViSession handle, ViAccessMode accessMode, ViUInt32 timeout);
+    /// @param connectBy leaves the connection less time than @p timeout.
+    ViStatus open(ViSession handle, ViAccessMode accessMode, ViUInt32 timeout, os::Deadline connectBy);
 
     ViStatus read(std::span<std::byte> buffer, std::size_t &count);
     ViStatus write(std::span<const std::byte> data, std::size_t &count);
+    FormattedIo &formatted() { return m_formatted; }
+
+    // For operations that consist of several transfers.
+    /// When an operation that begins now has to be over.
+    os::Deadline operationDeadline() const;
+    /// VI_SUCCESS when no lock of another session is in the way.
+    ViStatus mayTransfer();
+    ViStatus read(std::span<std::byte> buffer, std::size_t &count, os::Deadline deadline);
+    /// @param end false: no END goes with the last byte, whatever VI_ATTR_SEND_END_EN says.
+    ViStatus write(std::span<const std::byte> data, std::size_t &count, os::Deadline deadline, bool end);
+    const AttributeStore &attributes() const { return m_attributes; }
+    void setBufferSize(ViAttr attribute, std::size_t size) { m_attributes.setNumber(attribute, size); }
+
     ViStatus readStatusByte(ViUInt16 &status);
     ViStatus assertTrigger(ViUInt16 protocol);
     ViStatus clear();
@@ -52,6 +71,13 @@ public:
     ViStatus readAsync(std::span<std::byte> buffer, ViJobId &job);
     ViStatus writeAsync(std::span<const std::byte> data, ViJobId &job);
     ViStatus controlRemote(ViUInt16 mode);
+    // On GPIB interfaces alone.
+    ViStatus controlAttention(ViUInt16 mode);
+    ViStatus clearInterface();
+    ViStatus sendCommands(std::span<const std::byte> commands, std::size_t &count);
+    ViStatus passControl(ViUInt16 primary, ViUInt16 secondary);
+    /// viFlush() of the system's buffers.
+    ViStatus flushLine(ViUInt16 mask);
     ViStatus terminate(ViUInt16 degree, ViJobId job);
 
     ViStatus lock(ViAccessMode type, ViUInt32 timeout, const ViChar *requestedKey, ViChar *accessKey);
@@ -68,25 +94,24 @@ public:
 
 private:
     template <typename Operation>
-    ViStatus perform(const Operation &operation);
+    ViStatus perform(os::Deadline deadline, const Operation &operation);
     template <typename Operation>
-    ViStatus inTurn(os::Deadline deadline, const Operation &operation);
-    ViStatus mayTransfer(os::Deadline deadline);
-    ViStatus enterGate(os::Deadline deadline);
+    ViStatus inTurn(os::Deadline deadline, const CallWatch &watch, const Operation &operation);
+    ViStatus enterGate(os::Deadline deadline, const CallWatch &watch);
     TransferMode transferMode() const;
-    void describe(const ResourceName &name, ViSession resourceManager);
+    bool isInterface() const; ///< a GPIB interface, not an instrument
 
     const ResourceName m_name;
     AttributeStore m_attributes;
-    const std::shared_ptr<ResourceLocks> m_locks;
+    Interruptions m_interruptions;
+    SessionLocks m_locks;
     const std::shared_ptr<EventHub> m_events;
     std::unique_ptr<Transport> m_transport; ///< belongs to whoever has the turn
     os::Wakeup m_wakeup;
     IoGate m_gate;
+    FormattedIo m_formatted{*this};
     std::atomic<ViJobId> m_lastJob{0};
-    std::atomic<unsigned> m_terminations{0}; ///< tells a wait that began before viTerminate from one that began after
     std::atomic<bool> m_opened{false};
-    std::atomic<bool> m_closing{false};
 };
 
 } // namespace kyvisa

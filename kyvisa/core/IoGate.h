@@ -33,4 +33,17 @@ private:
     int m_waiting = 0;
 };
 
+/// Leaves a gate that was entered when the operation is over, also by an exception.
+class GateTurn
+{
+public:
+    explicit GateTurn(IoGate &gate) : m_gate(gate) {}
+    ~GateTurn() { m_gate.leave(); }
+    GateTurn(const GateTurn &) = delete;
+    GateTurn &operator=(const GateTurn &) = delete;
+
+private:
+    IoGate &m_gate;
+};
+
 } // namespace kyvisa

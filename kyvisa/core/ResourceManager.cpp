@@ -1,24 +1,45 @@
 #include "kyvisa/core/ResourceManager.h"
 
 #include "kyvisa/core/FindExpression.h"
+#include "kyvisa/core/FindList.h"
 #include "kyvisa/core/InstrumentSession.h"
+#include "kyvisa/core/KnownResources.h"
 #include "kyvisa/core/Library.h"
 #include "kyvisa/core/ResourceName.h"
+#include "kyvisa/core/Trace.h"
+#include "kyvisa/discovery/LanDiscovery.h"
 #include "kyvisa/include/visa.h"
+#include "kyvisa/os/SerialPorts.h"
+#include "kyvisa/os/WaitLimit.h"
 #include "kyvisa/transport/TransportFactory.h"
 
+#include <algorithm>
+#include <chrono>
 #include <cstring>
+#include <vector>
 
 namespace kyvisa
 {
 namespace
 {
 
-ViStatus parseText(const ViChar *text, ResourceName &name)
+constexpr std::chrono::milliseconds LongestFirstShare{5000};
+constexpr ViUInt64 Vxi11Mode = 2; // bits of VI_KY_ATTR_TCPIP_FIND_RSRC_MODE
+constexpr ViUInt64 MdnsMode = 4;
+
+std::chrono::milliseconds firstShare(os::Deadline deadline)
+{
+    return deadline.isNever()
+               ? LongestFirstShare
+               : std::min(LongestFirstShare,
+                          std::chrono::duration_cast<std::chrono::milliseconds>(deadline.remaining()) / 2);
+}
+
+ViStatus parseText(const ViChar *text, const Configuration &configuration, ResourceName &name)
 {
     if (!text)
         return VI_ERROR_INV_RSRC_NAME;
-    return parseResourceName({text, ::strnlen(text, MaxResourceName + 1)}, name);
+    return parseNameOrAlias({text, ::strnlen(text, MaxResourceName + 1)}, configuration, name);
 }
 
 } // namespace
@@ -28,17 +49,35 @@ ResourceManager::ResourceManager(Library &library) : m_library(library), m_attri
     m_attributes.setText(VI_ATTR_RSRC_NAME, "");
     m_attributes.setText(VI_ATTR_RSRC_CLASS, "RM");
     m_attributes.setText(VI_ATTR_RSRC_MANF_NAME, "Oltrava");
+    trace::switchTo(m_configuration.debug);
 }
 
 ViStatus ResourceManager::open(const ViChar *text, ViAccessMode accessMode, ViUInt32 timeout, ViSession &session)
 {
     session = VI_NULL;
     ResourceName name;
-    if (const ViStatus status = parseText(text, name); status < VI_SUCCESS)
+    if (const ViStatus status = parseText(text, m_configuration, name); status < VI_SUCCESS)
         return status;
     if ((accessMode & ~static_cast<ViAccessMode>(VI_EXCLUSIVE_LOCK | VI_LOAD_CONFIG)) != 0)
         return VI_ERROR_INV_ACC_MODE;
-    name = withTransportChosen(name);
+    // Each protocol but the last leaves at least half of the time to those behind it: a host may be silent in one of them.
+    const std::vector<ResourceName> choices = transportChoices(name, m_configuration);
+    const auto deadline = os::Deadline::afterVisaTimeout(timeout == VI_TMO_IMMEDIATE ? DefaultOpenTimeout : timeout);
+    ViStatus status = VI_ERROR_RSRC_NFOUND;
+    for (const ResourceName &choice : choices) {
+        const bool last = &choice == &choices.back();
+        const auto connectBy = last ? deadline : os::Deadline::after(firstShare(deadline));
+        const ViUInt32 left = timeout == VI_TMO_IMMEDIATE ? timeout : std::max(deadline.visaTimeoutLeft(), 1u);
+        status = openAs(choice, accessMode, left, connectBy, session);
+        if (status != VI_ERROR_RSRC_NFOUND && status != VI_ERROR_TMO)
+            break;
+    }
+    return status;
+}
+
+ViStatus ResourceManager::openAs(const ResourceName &name, ViAccessMode accessMode, ViUInt32 timeout,
+                                 os::Deadline connectBy, ViSession &session)
+{
     ViStatus status = VI_SUCCESS;
     const std::uint16_t kind = sessionKind(name, status);
     if (kind == 0)
@@ -49,7 +88,7 @@ ViStatus ResourceManager::open(const ViChar *text, ViAccessMode accessMode, ViUI
     if (handle == 0)
         return m_library.handles.find(m_handle) ? VI_ERROR_ALLOC : VI_ERROR_INV_OBJECT;
     try {
-        status = instrument->open(handle, accessMode, timeout);
+        status = instrument->open(handle, accessMode, timeout, connectBy);
     } catch (const std::bad_alloc &) {
         status = VI_ERROR_ALLOC;
     }
@@ -69,18 +108,64 @@ ViStatus ResourceManager::findResources(const ViChar *expression, ViFindList *fi
         *findList = VI_NULL;
     if (count)
         *count = 0;
-    if (!expression || !FindExpression::isValid(expression))
-        return VI_ERROR_INV_EXPR;
     if (first)
         *first = '\0';
-    return VI_ERROR_RSRC_NFOUND;
+    const auto parsed = expression ? FindExpression::parse(expression) : std::nullopt;
+    if (!parsed)
+        return VI_ERROR_INV_EXPR;
+    std::vector<FoundResource> found = search(*parsed);
+    if (found.empty())
+        return VI_ERROR_RSRC_NFOUND;
+    const std::string name = found.front().name;
+    const auto size = static_cast<ViUInt32>(found.size());
+    if (findList) {
+        *findList = m_library.handles.insert(std::make_shared<FindList>(std::move(found)), m_handle);
+        if (*findList == VI_NULL)
+            return m_library.handles.find(m_handle) ? VI_ERROR_ALLOC : VI_ERROR_INV_OBJECT;
+    }
+    if (count)
+        *count = size;
+    if (first)
+        std::memcpy(first, name.c_str(), name.size() + 1);
+    return VI_SUCCESS;
+}
+
+/// Everything that is known or found and matches, without repetition.
+std::vector<FoundResource> ResourceManager::search(const FindExpression &expression)
+{
+    std::vector<FoundResource> found = knownResources(m_configuration, os::serialPorts().size());
+    // The network is left alone where none of its resources is wanted.
+    if (expression.mayMatch("TCPIP"))
+        addResources(found, searchLan());
+    std::erase_if(found, [&](const FoundResource &resource) { return !expression.matches(resource.name); });
+    return found;
+}
+
+std::vector<FoundResource> ResourceManager::searchLan()
+{
+    const ViUInt64 mode = m_attributes.number(VI_KY_ATTR_TCPIP_FIND_RSRC_MODE);
+    const DiscoveryMethods methods{(mode & MdnsMode) != 0, (mode & Vxi11Mode) != 0};
+    if (!methods.any())
+        return {};
+    const auto wakeup = std::make_shared<os::Wakeup>();
+    if (!wakeup->valid())
+        return {};
+    {
+        const std::lock_guard lock(m_mutex);
+        if (m_closed)
+            return {};
+        std::erase_if(m_searches, [](const auto &search) { return search.expired(); });
+        m_searches.push_back(wakeup);
+    }
+    const auto timeout = static_cast<ViUInt32>(m_attributes.number(VI_KY_ATTR_TCPIP_FIND_RSRC_TMO));
+    return discoverLan(methods, {os::Deadline::afterVisaTimeout(timeout), *wakeup});
 }
 
 ViStatus ResourceManager::parse(const ViChar *text, ViUInt16 &interfaceType, ViUInt16 &board, ViChar *resourceClass,
                                 ViChar *expandedName, ViChar *alias) const
 {
     ResourceName name;
-    if (const ViStatus status = parseText(text, name); status < VI_SUCCESS)
+    if (const ViStatus status = parseText(text, m_configuration, name); status < VI_SUCCESS)
         return status;
     interfaceType = name.interfaceType;
     board = name.board;
@@ -90,7 +175,7 @@ ViStatus ResourceManager::parse(const ViChar *text, ViUInt16 &interfaceType, ViU
     };
     copy(resourceClass, name.className());
     copy(expandedName, name.canonical());
-    copy(alias, "");
+    copy(alias, aliasOf(name.canonical(), m_configuration));
     return VI_SUCCESS;
 }
 
@@ -111,6 +196,13 @@ ViStatus ResourceManager::setAttribute(ViAttr attribute, ViAttrState state)
 
 ViStatus ResourceManager::close()
 {
+    {
+        const std::lock_guard lock(m_mutex);
+        m_closed = true;
+        for (const auto &search : m_searches)
+            if (const auto wakeup = search.lock())
+                wakeup->close();
+    }
     for (ObjectPointer &child : m_library.handles.removeChildren(m_handle))
         dispose(std::move(child));
     return VI_SUCCESS;

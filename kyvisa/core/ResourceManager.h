@@ -1,14 +1,25 @@
 #pragma once
 
 #include "kyvisa/core/AttributeStore.h"
+#include "kyvisa/core/Configuration.h"
 #include "kyvisa/core/Object.h"
+#include "kyvisa/discovery/FoundResource.h"
+#include "kyvisa/os/Deadline.h"
 
-#include <atomic>
+#include <memory>
+#include <mutex>
+#include <vector>
 
 namespace kyvisa
 {
 
+class FindExpression;
 class Library;
+struct ResourceName;
+namespace os
+{
+class Wakeup;
+}
 
 /**
  * A resource manager session: opens and finds. What is opened or found through it is its child in the handle table, and
@@ -35,9 +46,20 @@ public:
     ResourceManager *asResourceManager() override { return this; }
 
 private:
+    ViStatus openAs(const ResourceName &name, ViAccessMode accessMode, ViUInt32 timeout, os::Deadline connectBy,
+                    ViSession &session);
+
+    std::vector<FoundResource> search(const FindExpression &expression);
+    std::vector<FoundResource> searchLan();
+
     Library &m_library;
+    const Configuration m_configuration = readConfiguration();
     AttributeStore m_attributes;
     ViSession m_handle = 0;
+
+    std::mutex m_mutex;
+    std::vector<std::weak_ptr<os::Wakeup>> m_searches; ///< those that go on, each on its caller's thread
+    bool m_closed = false;
 };
 
 } // namespace kyvisa

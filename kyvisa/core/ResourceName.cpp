@@ -21,6 +21,9 @@ struct InterfaceName {
     ViUInt16 type;
 };
 
+/// IEEE 488.1 sends secondary address 0 as this byte.
+constexpr int FirstSecondaryOnBus = 96;
+
 // The longer of two names with a common beginning comes first.
 constexpr std::array Interfaces = {
     InterfaceName{"GPIB-VXI", VI_INTF_GPIB_VXI}, InterfaceName{"GPIB", VI_INTF_GPIB},
@@ -159,10 +162,15 @@ bool parseGpib(const std::vector<std::string_view> &parts, ResourceName &name)
         return false;
     name.primaryAddress = *primary;
     if (parts.size() == 2) {
-        const auto secondary = number<ViUInt16>(parts[1]);
-        if (!secondary || *secondary > 31)
+        const auto given = number<ViUInt16>(parts[1]);
+        if (!given)
             return false;
-        name.secondaryAddress = *secondary;
+        // Some write it as it goes over the bus.
+        const int secondary = *given >= FirstSecondaryOnBus ? *given - FirstSecondaryOnBus : *given;
+        if (secondary > 30)
+            return false;
+        name.secondaryAddress = static_cast<ViUInt16>(secondary);
+        name.address = std::to_string(name.primaryAddress) + "::" + std::to_string(secondary);
     }
     return true;
 }
@@ -197,6 +205,12 @@ bool parseRegisterBased(const std::vector<std::string_view> &parts, ResourceName
     }
 }
 
+/// Nothing in it that would not be seen.
+bool isPlain(std::string_view text)
+{
+    return std::none_of(text.begin(), text.end(), [](unsigned char c) { return c <= ' ' || c == 0x7F; });
+}
+
 bool parseAddress(std::vector<std::string_view> parts, ResourceName &name)
 {
     switch (name.interfaceType) {
@@ -205,7 +219,7 @@ bool parseAddress(std::vector<std::string_view> parts, ResourceName &name)
     case VI_INTF_GPIB:
         return parseGpib(parts, name);
     case VI_INTF_ASRL:
-        return parts.empty() && name.resourceClass == Class::Instr;
+        return parts.empty() && name.resourceClass == Class::Instr && isPlain(name.address);
     case VI_INTF_USB:
         return parseUsb(parts, name);
     default:
@@ -231,6 +245,8 @@ std::string ResourceName::canonical() const
     for (const InterfaceName &known : Interfaces)
         if (known.type == interfaceType)
             text = known.prefix;
+    if (interfaceType == VI_INTF_ASRL && !address.empty())
+        return text + address + "::" + className();
     text += std::to_string(board);
     if (interfaceType == VI_INTF_TCPIP && resourceClass != Class::Servant) {
         const bool brackets = host.find(':') != host.npos;
@@ -261,7 +277,8 @@ ViStatus parseResourceName(std::string_view text, ResourceName &name)
     name.interfaceType = known->type;
 
     const std::string_view board = parts->front().substr(std::min(known->prefix.size(), parts->front().size()));
-    if (!board.empty()) {
+    const bool deviceFile = known->type == VI_INTF_ASRL && board.starts_with("/dev/");
+    if (!board.empty() && !deviceFile) {
         const auto value = number<ViUInt16>(board);
         if (!value)
             return VI_ERROR_INV_RSRC_NAME;
@@ -274,7 +291,9 @@ ViStatus parseResourceName(std::string_view text, ResourceName &name)
             parts->pop_back();
         }
     }
-    if (name.interfaceType != VI_INTF_TCPIP) {
+    if (deviceFile)
+        name.address = board;
+    else if (name.interfaceType != VI_INTF_TCPIP) {
         for (const std::string_view part : *parts)
             name.address.append(name.address.empty() ? "" : "::").append(part);
     }

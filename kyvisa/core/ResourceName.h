@@ -27,7 +27,11 @@ struct ResourceName {
     ViUInt16 primaryAddress = 0;
     ViUInt16 secondaryAddress = 0xFFFF; ///< VI_NO_SEC_ADDR
 
-    // Everything else: the parts between board and class, as given.
+    // where the LAN gateway of the board is, which no resource string says: the configuration does
+    std::string gatewayHost;
+    std::string gatewayInterface;
+
+    // Everything else: the parts between board and class, as given. ASRL: the device file, or empty for a port by number.
     std::string address;
 
     /// The device name says HiSLIP.

@@ -19,4 +19,17 @@ const char *statusText(ViStatus status)
     }
 }
 
+const char *statusName(ViStatus status)
+{
+    switch (status) {
+#define KYVISA_STATUS_CASE(name, text)                                                                                 \
+    case name:                                                                                                         \
+        return #name;
+        KYVISA_STATUS_TABLE(KYVISA_STATUS_CASE)
+#undef KYVISA_STATUS_CASE
+    default:
+        return nullptr;
+    }
+}
+
 } // namespace kyvisa

@@ -4,6 +4,7 @@
 #include "kyvisa/os/Resolver.h"
 #include "kyvisa/os/SystemCalls.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <vector>
@@ -59,6 +60,7 @@ IoResult Race::run(const WaitLimit &limit, StreamSocket &winner)
         }
         if (m_winner.isOpen()) {
             m_winner.setNoDelay(true);
+            m_winner.allowBriefWaits();
             winner = std::move(m_winner);
             return IoResult::Done;
         }
@@ -116,12 +118,16 @@ IoResult Race::waitAndCollect(const WaitLimit &limit, Deadline nextStart)
 
 } // namespace
 
-IoResult connectStream(const std::string &host, std::uint16_t port, const WaitLimit &limit, StreamSocket &connected)
+IoResult connectStream(const std::string &host, std::uint16_t port, const WaitLimit &limit, StreamSocket &connected,
+                       AddressOrder order)
 {
     std::vector<Address> addresses;
     const IoResult resolved = resolve(host, port, limit, addresses);
     if (resolved != IoResult::Done)
         return resolved;
+    if (order == AddressOrder::Ipv4First)
+        std::stable_partition(addresses.begin(), addresses.end(),
+                              [](const Address &address) { return address.storage.ss_family == AF_INET; });
     return Race(std::move(addresses)).run(limit, connected);
 }
 

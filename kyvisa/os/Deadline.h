@@ -32,6 +32,7 @@ public:
     /// What is left as a VISA time-out, rounded up to milliseconds.
     std::uint32_t visaTimeoutLeft() const;
     Clock::time_point end() const { return m_end; }
+    Deadline later(std::chrono::milliseconds span) const { return isNever() ? *this : Deadline(m_end + span); }
     Deadline orEarlier(Deadline other) const { return m_end <= other.m_end ? *this : other; }
 
 private:

@@ -2,6 +2,7 @@
 
 #include "kyvisa/os/Poll.h"
 #include "kyvisa/os/SystemCalls.h"
+#include "kyvisa/os/Thread.h"
 
 #include <arpa/inet.h>
 #include <array>
@@ -11,7 +12,6 @@
 #include <netinet/in.h>
 #include <strings.h>
 #include <system_error>
-#include <thread>
 
 namespace kyvisa::os
 {
@@ -104,7 +104,7 @@ IoResult askOnThread(const std::string &host, const std::string &service, const 
         return IoResult::NoMemory;
     }
     try {
-        std::thread([question] { answer(question); }).detach();
+        startThread([question] { answer(question); }).detach();
     } catch (const std::system_error &) {
         g_openQuestions.fetch_sub(1);
         return IoResult::NoMemory;

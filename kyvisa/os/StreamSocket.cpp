@@ -8,6 +8,8 @@
 #include <climits>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
+#include <sys/ioctl.h>
+#include <sys/time.h>
 #include <utility>
 
 namespace kyvisa::os
@@ -18,6 +20,10 @@ namespace
 constexpr int IdleSeconds = 60;
 constexpr int ProbeSeconds = 10;
 constexpr int UnansweredProbes = 6;
+
+/// The system counts this in ticks of up to 10 ms, and rounds it up by two of them.
+constexpr std::chrono::milliseconds BriefWait{5};
+constexpr std::chrono::milliseconds LongestBriefWait{50};
 
 bool wouldBlock(int error)
 {
@@ -39,13 +45,17 @@ void advance(std::span<iovec> &pieces, std::size_t count)
 
 } // namespace
 
-StreamSocket::StreamSocket(StreamSocket &&other) noexcept : m_descriptor(std::exchange(other.m_descriptor, -1)) {}
+StreamSocket::StreamSocket(StreamSocket &&other) noexcept
+    : m_descriptor(std::exchange(other.m_descriptor, -1)), m_waitsBriefly(other.m_waitsBriefly)
+{
+}
 
 StreamSocket &StreamSocket::operator=(StreamSocket &&other) noexcept
 {
     if (this != &other) {
         close();
         m_descriptor = std::exchange(other.m_descriptor, -1);
+        m_waitsBriefly = other.m_waitsBriefly;
     }
     return *this;
 }
@@ -79,7 +89,7 @@ Transfer StreamSocket::send(std::span<iovec> pieces, const WaitLimit &limit)
         msghdr message{};
         message.msg_iov = pieces.data();
         message.msg_iovlen = std::min<std::size_t>(pieces.size(), IOV_MAX);
-        const ssize_t sent = systemCalls().sendmsg(m_descriptor, &message, MSG_NOSIGNAL);
+        const ssize_t sent = systemCalls().sendmsg(m_descriptor, &message, MSG_NOSIGNAL | MSG_DONTWAIT);
         if (sent >= 0) {
             done.count += static_cast<std::size_t>(sent);
             advance(pieces, static_cast<std::size_t>(sent));
@@ -98,38 +108,57 @@ Transfer StreamSocket::send(std::span<iovec> pieces, const WaitLimit &limit)
     return done;
 }
 
-Transfer StreamSocket::receiveNow(std::span<std::byte> buffer)
+Transfer StreamSocket::receiveOnce(std::span<std::byte> buffer, int flags)
 {
     if (!isOpen())
         return {IoResult::Closed, 0};
     for (;;) {
-        const ssize_t got = systemCalls().recv(m_descriptor, buffer.data(), buffer.size(), 0);
+        const ssize_t got = systemCalls().recv(m_descriptor, buffer.data(), buffer.size(), flags);
         if (got > 0)
             return {IoResult::Done, static_cast<std::size_t>(got)};
         if (got == 0)
             return {IoResult::Closed, 0};
-        if (errno == EINTR)
+        // A wait that was interrupted is not begun again: signals without end would never let the deadline come.
+        if (errno == EINTR && flags == MSG_DONTWAIT)
             continue;
-        if (wouldBlock(errno))
+        if (errno == EINTR || wouldBlock(errno))
             return {IoResult::Done, 0};
         return {errno == ENOMEM || errno == ENOBUFS ? IoResult::NoMemory : IoResult::Closed, 0};
     }
 }
 
+Transfer StreamSocket::receiveNow(std::span<std::byte> buffer)
+{
+    return receiveOnce(buffer, MSG_DONTWAIT);
+}
+
+bool StreamSocket::mayWaitBriefly(const WaitLimit &limit) const
+{
+    return m_waitsBriefly && (limit.deadline.isNever() || limit.deadline.remaining() > LongestBriefWait);
+}
+
 Transfer StreamSocket::receive(std::span<std::byte> buffer, const WaitLimit &limit)
 {
-    // Trying first costs next to nothing while the answer is on its way, and saves the wait when it is here. A peer that
-    // never lets it come to a wait must not outlast the wake-up, so that is looked at here too.
-    for (;;) {
+    // A peer that never lets it come to a poll must not outlast the wake-up, so that is looked at here too.
+    for (bool first = true;; first = false) {
         if (limit.wakeup.raised())
             return {IoResult::Woken, 0};
-        const Transfer got = receiveNow(buffer);
+        const Transfer got = receiveOnce(buffer, first && mayWaitBriefly(limit) ? 0 : MSG_DONTWAIT);
         if (got.result != IoResult::Done || got.count > 0)
             return got;
         const IoResult waited = waitFor(POLLIN, limit);
         if (waited != IoResult::Done)
             return {waited, 0};
     }
+}
+
+void StreamSocket::allowBriefWaits()
+{
+    timeval wait{};
+    wait.tv_usec = std::chrono::microseconds(BriefWait).count();
+    int nonBlocking = 0;
+    m_waitsBriefly = systemCalls().setsockopt(m_descriptor, SOL_SOCKET, SO_RCVTIMEO, &wait, sizeof wait) == 0 &&
+                     systemCalls().ioctl(m_descriptor, FIONBIO, &nonBlocking) == 0;
 }
 
 bool StreamSocket::setNoDelay(bool on)
@@ -158,6 +187,16 @@ std::string StreamSocket::peerAddress() const
                       NI_NUMERICHOST) != 0)
         return {};
     return text.data();
+}
+
+std::uint32_t StreamSocket::localIpv4Address() const
+{
+    sockaddr_in address{};
+    socklen_t length = sizeof address;
+    if (::getsockname(m_descriptor, reinterpret_cast<sockaddr *>(&address), &length) != 0 ||
+        address.sin_family != AF_INET)
+        return 0;
+    return ntohl(address.sin_addr.s_addr);
 }
 
 } // namespace kyvisa::os

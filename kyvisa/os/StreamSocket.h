@@ -3,6 +3,7 @@
 #include "kyvisa/os/WaitLimit.h"
 
 #include <cstddef>
+#include <cstdint>
 #include <span>
 #include <string>
 #include <sys/uio.h>
@@ -17,7 +18,11 @@ struct Transfer {
 };
 
 /**
- * One connected TCP socket, non-blocking underneath: every wait is bounded by a WaitLimit.
+ * One connected TCP socket. Every wait is bounded by a WaitLimit.
+ *
+ * An answer is usually here within microseconds, and then a poll before the recv would be the dearest part of a query. So
+ * receive() first waits inside recv itself, which the system ends after BriefWait; only then does it poll, together with the
+ * wake-up. A wake-up may be noticed that much later, a deadline not: with little time left receive() polls at once.
  *
  * One thread receives and one thread sends at a time; the two may be different threads. The owner closes it when neither
  * is inside.
@@ -34,6 +39,8 @@ public:
 
     bool isOpen() const { return m_descriptor >= 0; }
     void close();
+    /// For waiting on several at once.
+    int descriptor() const { return m_descriptor; }
     /// Ends the connection both ways and keeps the descriptor, so it may come while the other thread is inside.
     void shutDown();
 
@@ -45,16 +52,23 @@ public:
     /// Takes what is there without waiting; Done with 0 bytes when nothing is.
     Transfer receiveNow(std::span<std::byte> buffer);
 
+    /// From now on receive() may wait in the system. Where that cannot be had it goes on polling.
+    void allowBriefWaits();
     bool setNoDelay(bool on);
     /// Asks the peer for a sign of life after a minute of silence: firewalls forget idle connections after a few.
     bool setKeepAlive(bool on);
     /// The peer's address in numbers, or an empty text.
     std::string peerAddress() const;
+    /// This end's IPv4 address in host order; 0 on a connection that is not of that family.
+    std::uint32_t localIpv4Address() const;
 
 private:
     IoResult waitFor(short events, const WaitLimit &limit) const;
+    bool mayWaitBriefly(const WaitLimit &limit) const;
+    Transfer receiveOnce(std::span<std::byte> buffer, int flags);
 
     int m_descriptor = -1;
+    bool m_waitsBriefly = false; ///< blocking, and the system ends the wait of a recv
 };
 
 } // namespace kyvisa::os

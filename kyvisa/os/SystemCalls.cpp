@@ -2,6 +2,8 @@
 
 #include <atomic>
 #include <sys/eventfd.h>
+#include <sys/file.h>
+#include <sys/ioctl.h>
 #include <unistd.h>
 
 namespace kyvisa::os
@@ -14,9 +16,49 @@ int pollWithoutSignalMask(pollfd *descriptors, nfds_t count, const timespec *tim
     return ::ppoll(descriptors, count, timeout, nullptr);
 }
 
+int openPath(const char *path, int flags, mode_t mode)
+{
+    return ::open(path, flags, mode);
+}
+
+int lockFile(int descriptor, int command, struct flock *lock)
+{
+    return ::fcntl(descriptor, command, lock);
+}
+
+ssize_t receiveFrom(int descriptor, void *buffer, size_t size, int flags, sockaddr *from, socklen_t *length)
+{
+    return ::recvfrom(descriptor, buffer, size, flags, from, length);
+}
+
+int controlDevice(int descriptor, unsigned long request, void *argument)
+{
+    return ::ioctl(descriptor, request, argument);
+}
+
 constexpr SystemCalls Real = {
-    ::socket,   ::connect, pollWithoutSignalMask, ::recv, ::sendmsg, ::setsockopt, ::getsockopt, ::eventfd,
-    ::shutdown, ::close,   ::getaddrinfo,
+    .socket = ::socket,
+    .connect = ::connect,
+    .poll = pollWithoutSignalMask,
+    .recv = ::recv,
+    .sendmsg = ::sendmsg,
+    .setsockopt = ::setsockopt,
+    .getsockopt = ::getsockopt,
+    .eventfd = ::eventfd,
+    .shutdown = ::shutdown,
+    .close = ::close,
+    .bind = ::bind,
+    .listen = ::listen,
+    .accept4 = ::accept4,
+    .open = openPath,
+    .ioctl = controlDevice,
+    .read = ::read,
+    .write = ::write,
+    .flock = ::flock,
+    .lockFile = lockFile,
+    .recvfrom = receiveFrom,
+    .getifaddrs = ::getifaddrs,
+    .getaddrinfo = ::getaddrinfo,
 };
 
 std::atomic<const SystemCalls *> g_calls{&Real};

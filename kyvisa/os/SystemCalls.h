@@ -1,5 +1,7 @@
 #pragma once
 
+#include <fcntl.h>
+#include <ifaddrs.h>
 #include <netdb.h>
 #include <poll.h>
 #include <sys/socket.h>
@@ -23,6 +25,17 @@ struct SystemCalls {
     int (*eventfd)(unsigned initial, int flags);
     int (*shutdown)(int descriptor, int how);
     int (*close)(int descriptor);
+    int (*bind)(int descriptor, const sockaddr *address, socklen_t length);
+    int (*listen)(int descriptor, int backlog);
+    int (*accept4)(int descriptor, sockaddr *address, socklen_t *length, int flags);
+    int (*open)(const char *path, int flags, mode_t mode);
+    int (*ioctl)(int descriptor, unsigned long request, void *argument);
+    ssize_t (*read)(int descriptor, void *buffer, size_t size);
+    ssize_t (*write)(int descriptor, const void *data, size_t size);
+    int (*flock)(int descriptor, int operation);
+    int (*lockFile)(int descriptor, int command, struct flock *lock); ///< fcntl() with a lock
+    ssize_t (*recvfrom)(int descriptor, void *buffer, size_t size, int flags, sockaddr *from, socklen_t *length);
+    int (*getifaddrs)(ifaddrs **result);
     int (*getaddrinfo)(const char *node, const char *service, const addrinfo *hints, addrinfo **result);
 };
 

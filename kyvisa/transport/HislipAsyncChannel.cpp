@@ -2,9 +2,10 @@
 
 #include "kyvisa/include/visa.h"
 #include "kyvisa/os/Poll.h"
+#include "kyvisa/os/Thread.h"
 #include "kyvisa/transport/IoStatus.h"
 
-#include <chrono>
+#include <algorithm>
 #include <system_error>
 
 namespace kyvisa
@@ -17,11 +18,13 @@ namespace
 {
 
 constexpr std::size_t InputCapacity = 1024;
+/// AsyncInterrupted messages without a counterpart that are kept. One is the rule.
+constexpr std::size_t MostInterruptions = 16;
+constexpr std::uint8_t LockGranted = 1;
 
 bool isResponse(MessageType type)
 {
     switch (type) {
-    case MessageType::AsyncLockResponse:
     case MessageType::AsyncRemoteLocalResponse:
     case MessageType::AsyncMaximumMessageSizeResponse:
     case MessageType::AsyncInitializeResponse:
@@ -43,28 +46,42 @@ HislipAsyncChannel::~HislipAsyncChannel()
     close();
 }
 
+/// Sends a request behind what is left of an earlier one. @param begun some of it left.
+IoResult HislipAsyncChannel::post(const Header &request, std::span<const std::byte> payload, bool &begun,
+                                  const os::WaitLimit &limit)
+{
+    std::size_t sent = 0;
+    IoResult result;
+    begun = false;
+    {
+        const std::lock_guard sending(m_sending);
+        result = m_channel.finishMessage(limit);
+        if (result == IoResult::Done) {
+            result = m_channel.send(request, payload, limit, sent);
+            begun = result == IoResult::Done || m_channel.messageIsHalfSent();
+        }
+    }
+    payBack(limit.wakeup);
+    return result;
+}
+
 ViStatus HislipAsyncChannel::transact(const Header &request, std::span<const std::byte> payload, MessageType expected,
                                       Reply &reply, const os::WaitLimit &limit)
 {
+    unsigned &unanswered = m_unanswered[static_cast<std::uint8_t>(expected)];
     {
         const std::lock_guard lock(m_mutex);
         if (m_lost)
             return VI_ERROR_CONN_LOST;
         m_reply.reset();
-        ++m_unanswered[static_cast<std::uint8_t>(expected)];
+        ++unanswered;
     }
-    std::size_t sent = 0;
-    IoResult result;
-    {
-        const std::lock_guard sending(m_sending);
-        result = m_channel.finishMessage(limit);
-        if (result == IoResult::Done)
-            result = m_channel.send(request, payload, limit, sent);
-    }
+    bool begun = false;
+    const IoResult result = post(request, payload, begun, limit);
     if (result != IoResult::Done) {
+        // What was cut in the middle is finished before the next request, and then it is answered.
         const std::lock_guard lock(m_mutex);
-        unsigned &unanswered = m_unanswered[static_cast<std::uint8_t>(expected)];
-        if (unanswered > 0)
+        if (!begun && unanswered > 0)
             --unanswered;
         return transferStatus(result, limit);
     }
@@ -75,9 +92,136 @@ ViStatus HislipAsyncChannel::transact(const Header &request, std::span<const std
     const std::lock_guard lock(m_mutex);
     if (!m_reply || m_reply->header.type != expected)
         return status;
-    m_unanswered[static_cast<std::uint8_t>(expected)] = 0;
+    unanswered = 0;
     reply = *m_reply;
     return VI_SUCCESS;
+}
+
+bool HislipAsyncChannel::awaits(MessageType type)
+{
+    const std::lock_guard lock(m_mutex);
+    return m_unanswered[static_cast<std::uint8_t>(type)] > 0;
+}
+
+ViStatus HislipAsyncChannel::awaitAnswers(MessageType type, const os::WaitLimit &limit)
+{
+    {
+        const std::lock_guard sending(m_sending);
+        if (const IoResult result = m_channel.finishMessage(limit); result != IoResult::Done)
+            return transferStatus(result, limit);
+    }
+    return await(
+        [&]() -> std::optional<ViStatus> {
+            return m_unanswered[static_cast<std::uint8_t>(type)] == 0 ? std::optional<ViStatus>(VI_SUCCESS)
+                                                                      : std::nullopt;
+        },
+        limit);
+}
+
+ViStatus HislipAsyncChannel::requestLock(std::chrono::milliseconds patience, std::span<const std::byte> key,
+                                         std::uint32_t lastSentId, std::uint8_t &control, const os::WaitLimit &limit)
+{
+    const auto milliseconds = static_cast<std::uint32_t>(patience.count());
+    return lockCall({MessageType::AsyncLock, 1, milliseconds, key.size()}, key, {true, false, lastSentId}, control,
+                    limit);
+}
+
+ViStatus HislipAsyncChannel::releaseLock(std::uint32_t lastSentId, std::uint8_t &control, const os::WaitLimit &limit)
+{
+    return lockCall({MessageType::AsyncLock, 0, lastSentId, 0}, {}, {false, false, lastSentId}, control, limit);
+}
+
+ViStatus HislipAsyncChannel::lockCall(const Header &header, std::span<const std::byte> payload, const LockCall &call,
+                                      std::uint8_t &control, const os::WaitLimit &limit)
+{
+    // Answers to lock and unlock look alike: those that were given up come first.
+    {
+        const std::lock_guard sending(m_sending);
+        if (const IoResult result = m_channel.finishMessage(limit); result != IoResult::Done)
+            return transferStatus(result, limit);
+    }
+    payBack(limit.wakeup);
+    const ViStatus settled = await(
+        [this]() -> std::optional<ViStatus> {
+            return m_lockCalls.empty() && !m_lockToReturn ? std::optional<ViStatus>(VI_SUCCESS) : std::nullopt;
+        },
+        limit);
+    if (settled != VI_SUCCESS)
+        return settled == VI_ERROR_TMO && call.request ? VI_ERROR_RSRC_LOCKED : settled;
+    {
+        const std::lock_guard lock(m_mutex);
+        m_reply.reset();
+        m_lockAnswer.reset();
+        m_lockCalls.push_back(call);
+    }
+    bool begun = false;
+    const IoResult result = post(header, payload, begun, limit);
+    if (result != IoResult::Done) {
+        giveUpLockCall(begun);
+        return transferStatus(result, limit);
+    }
+    const ViStatus status = await(
+        [&]() -> std::optional<ViStatus> {
+            if (m_lockAnswer)
+                return VI_SUCCESS;
+            if (!m_reply || m_reply->header.type != MessageType::Error)
+                return std::nullopt;
+            m_lockCalls.clear();
+            return static_cast<ErrorCode>(m_reply->header.control) == ErrorCode::UnknownMessageType ? VI_ERROR_NSUP_OPER
+                                                                                                    : VI_ERROR_IO;
+        },
+        limit);
+    if (status != VI_SUCCESS) {
+        giveUpLockCall(true);
+        return status;
+    }
+    const std::lock_guard lock(m_mutex);
+    control = *m_lockAnswer;
+    return VI_SUCCESS;
+}
+
+/// @param begun the request left, at least in part, so it will be answered.
+void HislipAsyncChannel::giveUpLockCall(bool begun)
+{
+    bool mayBeGranted = false;
+    {
+        const std::lock_guard lock(m_mutex);
+        if (m_lockCalls.empty() || m_lost)
+            return;
+        if (begun) {
+            m_lockCalls.back().givenUp = true;
+            mayBeGranted = m_lockCalls.back().request;
+        } else {
+            m_lockCalls.pop_back();
+        }
+    }
+    if (mayBeGranted && !m_stop.closed())
+        startReading();
+}
+
+/// Returns a lock that came too late, unless that would have to wait: then the next request on its way out does it.
+void HislipAsyncChannel::payBack(const os::Wakeup &wakeup)
+{
+    const std::unique_lock sending(m_sending, std::try_to_lock);
+    if (!sending || m_channel.messageIsHalfSent())
+        return;
+    std::uint32_t lastSentId = 0;
+    {
+        const std::lock_guard lock(m_mutex);
+        if (!m_lockToReturn)
+            return;
+        lastSentId = *m_lockToReturn;
+        m_lockToReturn.reset();
+        m_lockCalls.push_back({false, true, lastSentId});
+    }
+    std::size_t sent = 0;
+    const IoResult result =
+        m_channel.send({MessageType::AsyncLock, 0, lastSentId, 0}, {}, {os::Deadline::now(), wakeup}, sent);
+    if (result == IoResult::Done || m_channel.messageIsHalfSent())
+        return;
+    const std::lock_guard lock(m_mutex);
+    m_lockCalls.pop_back();
+    m_lockToReturn = lastSentId;
 }
 
 std::optional<ViStatus> HislipAsyncChannel::answered(MessageType expected, Reply &reply)
@@ -93,25 +237,32 @@ std::optional<ViStatus> HislipAsyncChannel::answered(MessageType expected, Reply
     return VI_SUCCESS;
 }
 
-unsigned HislipAsyncChannel::interruptions()
+bool HislipAsyncChannel::interrupted(std::uint32_t messageId)
 {
     const std::lock_guard lock(m_mutex);
-    return m_interruptions;
+    return std::find(m_interrupted.begin(), m_interrupted.end(), messageId) != m_interrupted.end();
 }
 
-ViStatus HislipAsyncChannel::awaitInterruptions(unsigned count, const os::WaitLimit &limit)
+bool HislipAsyncChannel::takeInterruption(std::uint32_t messageId)
+{
+    const std::lock_guard lock(m_mutex);
+    return std::erase(m_interrupted, messageId) > 0;
+}
+
+ViStatus HislipAsyncChannel::awaitInterruption(std::uint32_t messageId, const os::WaitLimit &limit)
 {
     return await(
         [&]() -> std::optional<ViStatus> {
-            return m_interruptions >= count ? std::optional<ViStatus>(VI_SUCCESS) : std::nullopt;
+            return std::erase(m_interrupted, messageId) > 0 ? std::optional<ViStatus>(VI_SUCCESS) : std::nullopt;
         },
         limit);
 }
 
-void HislipAsyncChannel::forgetInterruptions()
+void HislipAsyncChannel::forgetPast()
 {
     const std::lock_guard lock(m_mutex);
-    m_interruptions = 0;
+    m_interrupted.clear();
+    m_lockCalls.clear();
 }
 
 ViStatus HislipAsyncChannel::await(const Condition &condition, const os::WaitLimit &limit)
@@ -173,9 +324,15 @@ IoResult HislipAsyncChannel::sort(const Header &header, const os::WaitLimit &lim
     }
     case MessageType::AsyncInterrupted: {
         const std::lock_guard lock(m_mutex);
-        ++m_interruptions;
+        m_interrupted.push_back(header.parameter);
+        if (m_interrupted.size() > MostInterruptions)
+            m_interrupted.pop_front();
         break;
     }
+    case MessageType::AsyncLockResponse:
+        keepLockAnswer(header.control);
+        payBack(limit.wakeup);
+        break;
     case MessageType::FatalError:
         return IoResult::Closed;
     default:
@@ -219,6 +376,19 @@ void HislipAsyncChannel::keepReply(const Header &header, const std::array<std::b
     }
 }
 
+void HislipAsyncChannel::keepLockAnswer(std::uint8_t control)
+{
+    const std::lock_guard lock(m_mutex);
+    if (m_lockCalls.empty())
+        return; // nobody asked
+    const LockCall call = m_lockCalls.front();
+    m_lockCalls.pop_front();
+    if (!call.givenUp)
+        m_lockAnswer = control;
+    else if (call.request && control == LockGranted)
+        m_lockToReturn = call.lastSentId;
+}
+
 ViStatus HislipAsyncChannel::watch(std::function<void()> notify)
 {
     {
@@ -227,16 +397,21 @@ ViStatus HislipAsyncChannel::watch(std::function<void()> notify)
             return VI_ERROR_CONN_LOST;
         m_notify = std::move(notify);
     }
+    return startReading() ? VI_SUCCESS : VI_ERROR_ALLOC;
+}
+
+bool HislipAsyncChannel::startReading()
+{
     if (m_thread)
-        return VI_SUCCESS;
+        return true;
     if (!m_stop.valid() || !m_news.valid())
-        return VI_ERROR_ALLOC;
+        return false;
     try {
-        m_thread = std::make_unique<std::thread>([this] { readForEver(); });
+        m_thread = std::make_unique<std::thread>(os::startThread([this] { readForEver(); }));
     } catch (const std::system_error &) {
-        return VI_ERROR_ALLOC;
+        return false;
     }
-    return VI_SUCCESS;
+    return true;
 }
 
 void HislipAsyncChannel::readForEver()

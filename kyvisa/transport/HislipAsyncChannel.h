@@ -4,6 +4,9 @@
 #include "kyvisa/transport/HislipChannel.h"
 
 #include <array>
+#include <chrono>
+#include <cstdint>
+#include <deque>
 #include <functional>
 #include <memory>
 #include <mutex>
@@ -21,6 +24,8 @@ namespace kyvisa
  * on a thread of this object reads, and callers wait for it. One caller at a time.
  *
  * A response that came too late for its call is told from the next one by counting: requests of a type are answered in order.
+ * A lock that is granted too late is given back at once, by whoever receives the grant; so that somebody does, a lock request
+ * that is given up starts the thread.
  */
 class HislipAsyncChannel
 {
@@ -36,11 +41,25 @@ public:
     ViStatus transact(const wire::hislip::Header &request, std::span<const std::byte> payload,
                       wire::hislip::MessageType expected, Reply &reply, const os::WaitLimit &limit);
 
-    /// AsyncInterrupted messages since the beginning or the last device clear.
-    unsigned interruptions();
-    /// Waits until there were at least @p count.
-    ViStatus awaitInterruptions(unsigned count, const os::WaitLimit &limit);
-    void forgetInterruptions();
+    /// A request of that type is unanswered.
+    bool awaits(wire::hislip::MessageType type);
+    /// Waits until every request of that type was answered, also those that were given up.
+    ViStatus awaitAnswers(wire::hislip::MessageType type, const os::WaitLimit &limit);
+
+    /// AsyncLock. @param control receives that of the response. @param lastSentId names the last message on the other channel.
+    ViStatus requestLock(std::chrono::milliseconds patience, std::span<const std::byte> key, std::uint32_t lastSentId,
+                         std::uint8_t &control, const os::WaitLimit &limit);
+    ViStatus releaseLock(std::uint32_t lastSentId, std::uint8_t &control, const os::WaitLimit &limit);
+
+    /// AsyncInterrupted has come for this message, and its counterpart has not.
+    bool interrupted(std::uint32_t messageId);
+    /// The counterpart has come: true when AsyncInterrupted had, too.
+    bool takeInterruption(std::uint32_t messageId);
+    /// Waits for AsyncInterrupted and takes it.
+    ViStatus awaitInterruption(std::uint32_t messageId, const os::WaitLimit &limit);
+
+    /// After a device clear: interruptions and unanswered locks are things of the past.
+    void forgetPast();
 
     /// Calls @p notify for each service request from now on.
     ViStatus watch(std::function<void()> notify);
@@ -52,16 +71,31 @@ public:
 private:
     using Condition = std::function<std::optional<ViStatus>()>;
 
+    /// A lock or unlock that is on its way. The two are answered alike, in order.
+    struct LockCall {
+        bool request = false;
+        bool givenUp = false;
+        std::uint32_t lastSentId = 0;
+    };
+
     ViStatus await(const Condition &condition, const os::WaitLimit &limit);
+    os::IoResult post(const wire::hislip::Header &request, std::span<const std::byte> payload, bool &begun,
+                      const os::WaitLimit &limit);
+    ViStatus lockCall(const wire::hislip::Header &header, std::span<const std::byte> payload, const LockCall &call,
+                      std::uint8_t &control, const os::WaitLimit &limit);
+    void giveUpLockCall(bool begun);
+    void payBack(const os::Wakeup &wakeup);
     os::IoResult receiveOne(const os::WaitLimit &limit);
     os::IoResult refuse(wire::hislip::MessageType type, const os::Wakeup &wakeup);
     os::IoResult sort(const wire::hislip::Header &header, const os::WaitLimit &limit);
     void keepReply(const wire::hislip::Header &header, const std::array<std::byte, 8> &payload);
+    void keepLockAnswer(std::uint8_t control);
+    bool startReading();
     void readForEver();
     std::optional<ViStatus> answered(wire::hislip::MessageType expected, Reply &reply);
 
     HislipChannel m_channel; ///< receiving belongs to the thread once there is one
-    std::mutex m_sending;    ///< the caller's requests, and refusals by whoever receives
+    std::mutex m_sending;    ///< the caller's requests, and what whoever receives has to send
     std::unique_ptr<std::thread> m_thread;
     os::Wakeup m_stop;
     os::Wakeup m_news; ///< raised by the thread after each message
@@ -70,7 +104,10 @@ private:
     std::function<void()> m_notify;
     std::array<unsigned, 256> m_unanswered{}; ///< requests by the type of their response
     std::optional<Reply> m_reply;
-    unsigned m_interruptions = 0;
+    std::deque<LockCall> m_lockCalls;
+    std::optional<std::uint8_t> m_lockAnswer;
+    std::optional<std::uint32_t> m_lockToReturn; ///< a lock was granted too late; the message to name in its release
+    std::deque<std::uint32_t> m_interrupted;
     bool m_lost = false;
 };
 

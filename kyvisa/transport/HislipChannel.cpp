@@ -15,6 +15,8 @@ namespace
 constexpr std::uint64_t LongestData = std::uint64_t{1} << 40;
 /// Everything else: sizes, texts.
 constexpr std::uint64_t LongestOther = 64 * 1024;
+/// A payload that is kept for finishMessage(): lock strings, sizes.
+constexpr std::size_t ShortPayload = 256;
 
 } // namespace
 
@@ -100,6 +102,10 @@ IoResult HislipChannel::send(const Header &header, std::span<const std::byte> pa
     if (sent.result != IoResult::Done && sent.count > 0) {
         m_headerUnsent = HeaderSize - std::min(sent.count, HeaderSize);
         m_payloadUnsent = payload.size() - payloadSent;
+        if (payload.size() <= ShortPayload)
+            m_shortPayload.assign(payload.begin(), payload.end());
+        else
+            m_shortPayload.clear();
     }
     return sent.result;
 }
@@ -110,9 +116,11 @@ IoResult HislipChannel::finishMessage(const os::WaitLimit &limit)
         std::array<std::byte, 4096> filler;
         filler.fill(std::byte{' '});
         const bool inHeader = m_headerUnsent > 0;
+        const auto size = static_cast<std::size_t>(std::min<std::uint64_t>(filler.size(), m_payloadUnsent));
+        std::byte *payload =
+            m_shortPayload.empty() ? filler.data() : m_shortPayload.data() + m_shortPayload.size() - size;
         std::array pieces = {inHeader ? iovec{m_header.data() + (HeaderSize - m_headerUnsent), m_headerUnsent}
-                                      : iovec{filler.data(), static_cast<std::size_t>(std::min<std::uint64_t>(
-                                                                 filler.size(), m_payloadUnsent))}};
+                                      : iovec{payload, size}};
         const os::Transfer sent = m_socket.send(pieces, limit);
         if (inHeader)
             m_headerUnsent -= sent.count;

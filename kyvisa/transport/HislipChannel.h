@@ -8,6 +8,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <span>
+#include <vector>
 
 namespace kyvisa
 {
@@ -42,8 +43,10 @@ public:
     os::IoResult send(const wire::hislip::Header &header, std::span<const std::byte> payload,
                       const os::WaitLimit &limit, std::size_t &payloadSent);
     /// A message stopped in the middle: nothing else can be sent before finishMessage().
-    bool messageIsHalfSent() const { return m_headerUnsent > 0 || m_payloadUnsent > 0; }
-    /// Sends the rest with filler in place of the payload: for a peer that is going to discard it.
+    bool messageIsHalfSent() const { return unsent() > 0; }
+    std::uint64_t unsent() const { return m_headerUnsent + m_payloadUnsent; }
+    /// Sends the rest. A short payload goes out as it was meant, a long one is not kept and replaced by filler: for a peer
+    /// that is going to discard it.
     os::IoResult finishMessage(const os::WaitLimit &limit);
 
     /// Tells the peer that the connection is beyond repair, if that is possible without waiting, and ends it. The
@@ -59,6 +62,7 @@ private:
     std::array<std::byte, wire::hislip::HeaderSize> m_header{}; ///< of the message being sent
     std::size_t m_headerUnsent = 0;
     std::uint64_t m_payloadUnsent = 0;
+    std::vector<std::byte> m_shortPayload; ///< its last bytes are the unsent ones; empty for a long payload
 };
 
 } // namespace kyvisa

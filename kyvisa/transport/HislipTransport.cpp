@@ -1,11 +1,10 @@
 #include "kyvisa/transport/HislipTransport.h"
 
-#include "kyvisa/core/AttributeStore.h"
 #include "kyvisa/include/visa.h"
-#include "kyvisa/os/Connector.h"
 #include "kyvisa/transport/IoStatus.h"
 
 #include <algorithm>
+#include <chrono>
 #include <cstring>
 
 namespace kyvisa
@@ -17,95 +16,23 @@ using os::IoResult;
 namespace
 {
 
-constexpr std::size_t InputCapacity = 16 * 1024;
-constexpr std::uint16_t VendorId = 'Z' << 8 | 'Z'; // registered to nobody
 constexpr std::uint8_t DeliveredFlag = 1;
 constexpr std::uint8_t OverlapFlag = 1;
-constexpr std::uint8_t EncryptionFlags = 2 | 4; // mandatory, required at the beginning
+constexpr std::uint8_t ExclusiveGranted = 1; ///< in AsyncLockInfoResponse
+
+/// How long the counterpart of an Interrupted message may take. An instrument that never sends it does not stop the writes.
+constexpr std::chrono::milliseconds PatienceForCounterpart{2000};
+/// An instrument that takes nothing for so long does not look at its input.
+constexpr std::chrono::milliseconds PatienceForStillInput{500};
+/// For the question who holds a lock, behind a read that has timed out.
+constexpr std::chrono::milliseconds PatienceForLockInfo{200};
 
 std::uint8_t control(auto code)
 {
     return static_cast<std::uint8_t>(code);
 }
 
-/// Why an instrument refused a session.
-ViStatus refusal(const Header &header)
-{
-    if (header.type != MessageType::FatalError)
-        return VI_ERROR_RSRC_NFOUND;
-    switch (static_cast<FatalErrorCode>(header.control)) {
-    case FatalErrorCode::MaximumClients:
-        return VI_ERROR_RSRC_BUSY;
-    case FatalErrorCode::SecureConnectionFailed:
-        return VI_ERROR_INV_PROT;
-    default:
-        return VI_ERROR_RSRC_NFOUND;
-    }
-}
-
-/// While opening, a connection that breaks off is a resource that is not there.
-ViStatus whileOpening(ViStatus status)
-{
-    return status == VI_ERROR_CONN_LOST || status == VI_ERROR_IO ? VI_ERROR_RSRC_NFOUND : status;
-}
-
-ViStatus initialize(HislipChannel &channel, const std::string &subAddress, Header &response, const os::WaitLimit &limit)
-{
-    const Header request{MessageType::Initialize, 0, initializeParameter(Version1, VendorId), subAddress.size()};
-    std::size_t sent = 0;
-    IoResult result = channel.send(request, std::as_bytes(std::span(subAddress)), limit, sent);
-    if (result == IoResult::Done)
-        result = channel.next(response, limit);
-    if (result != IoResult::Done)
-        return whileOpening(transferStatus(result, limit));
-    if (response.type != MessageType::InitializeResponse)
-        return refusal(response);
-    if ((response.control & EncryptionFlags) != 0)
-        return VI_ERROR_INV_PROT;
-    return VI_SUCCESS;
-}
-
 } // namespace
-
-ViStatus HislipTransport::connect(const ResourceName &name, const os::WaitLimit &limit, AttributeStore &attributes,
-                                  std::unique_ptr<Transport> &transport)
-{
-    os::StreamSocket socket;
-    IoResult connected = os::connectStream(name.host, name.port, limit, socket);
-    if (connected != IoResult::Done)
-        return connectStatus(connected, limit);
-    const std::string address = socket.peerAddress();
-    attributes.setText(VI_ATTR_TCPIP_ADDR, address);
-    HislipChannel sync(std::move(socket), InputCapacity);
-    Header response;
-    ViStatus status = initialize(sync, name.deviceName, response, limit);
-    if (status < VI_SUCCESS)
-        return status;
-
-    os::StreamSocket asyncSocket;
-    // A name may have several addresses: the other connection belongs to the instrument that answered the first.
-    connected = os::connectStream(address.empty() ? name.host : address, name.port, limit, asyncSocket);
-    if (connected != IoResult::Done)
-        return connectStatus(connected, limit);
-    auto async = std::make_unique<HislipAsyncChannel>(std::move(asyncSocket));
-    const std::uint32_t session = response.parameter & 0xFFFF;
-    HislipAsyncChannel::Reply reply;
-    status = async->transact({MessageType::AsyncInitialize, 0, session, 0}, {}, MessageType::AsyncInitializeResponse,
-                             reply, limit);
-    if (status < VI_SUCCESS)
-        return whileOpening(status);
-
-    const bool overlapped = (response.control & OverlapFlag) != 0;
-    auto hislip = std::make_unique<HislipTransport>(std::move(sync), std::move(async), overlapped);
-    status = hislip->agreeOnSizes(attributes.number(VI_ATTR_TCPIP_HISLIP_MAX_MESSAGE_KB) * 1024, limit);
-    if (status < VI_SUCCESS)
-        return whileOpening(status);
-    const std::uint32_t version = std::min<std::uint32_t>(response.parameter >> 16, Version1);
-    attributes.setNumber(VI_ATTR_TCPIP_HISLIP_VERSION, (version >> 8) << 20 | (version & 0xFF) << 8);
-    attributes.setNumber(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, overlapped ? VI_TRUE : VI_FALSE);
-    transport = std::move(hislip);
-    return VI_SUCCESS;
-}
 
 HislipTransport::HislipTransport(HislipChannel sync, std::unique_ptr<HislipAsyncChannel> async, bool overlapped)
     : m_sync(std::move(sync)), m_async(std::move(async)), m_overlapped(overlapped)
@@ -142,11 +69,17 @@ ViStatus HislipTransport::ended(IoResult result, const os::WaitLimit &limit)
     return checked(transferStatus(result, limit));
 }
 
-std::uint32_t HislipTransport::takeNextId()
+/// Sends a message that has an id. One of which nothing left has used up neither the id nor the word of delivery.
+IoResult HislipTransport::sendNumbered(MessageType type, std::span<const std::byte> payload, const os::WaitLimit &limit,
+                                       std::size_t &sent)
 {
-    const std::uint32_t id = m_nextId;
-    m_nextId += 2;
-    return id;
+    const Header header{type, takeDeliveredFlag(), m_nextId, payload.size()};
+    const IoResult result = m_sync.send(header, payload, limit, sent);
+    if (result == IoResult::Done || m_sync.messageIsHalfSent())
+        m_nextId += 2;
+    else
+        m_deliveredToReport = header.control != 0;
+    return result;
 }
 
 std::uint8_t HislipTransport::takeDeliveredFlag()
@@ -158,6 +91,19 @@ std::uint8_t HislipTransport::takeDeliveredFlag()
 
 ViStatus HislipTransport::read(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
                                std::size_t &count)
+{
+    const bool immediate = limit.deadline.expired();
+    if (const ViStatus status = finishClear(limit); status < VI_SUCCESS)
+        return status;
+    const ViStatus status = readResponse(buffer, mode, limit, count);
+    // While another client has a lock the instrument does not even look at the question.
+    if (status == VI_ERROR_TMO && count == 0 && !immediate && lockedByAnother(limit.wakeup))
+        return VI_ERROR_RSRC_LOCKED;
+    return status;
+}
+
+ViStatus HislipTransport::readResponse(std::span<std::byte> buffer, const TransferMode &mode,
+                                       const os::WaitLimit &limit, std::size_t &count)
 {
     for (;;) {
         if (!m_inMessage) {
@@ -229,8 +175,11 @@ ViStatus HislipTransport::nextData(std::size_t &count, const os::WaitLimit &limi
         case MessageType::DataEnd: {
             const bool unnamed = header.type == MessageType::Data && header.parameter == UnknownMessageId;
             const bool ours = header.parameter == lastSentId() || unnamed;
+            // Interrupted was faster: the two halves make one interruption, which is over.
+            if (m_interrupted && m_async->takeInterruption(*m_interrupted))
+                m_interrupted.reset();
             // AsyncInterrupted was faster than its counterpart here: until that comes, everything is stale.
-            const bool stale = !m_overlapped && (!ours || m_async->interruptions() > m_interruptions);
+            const bool stale = !m_overlapped && (!ours || m_async->interrupted(lastSentId()));
             if (stale) {
                 count = 0;
                 break;
@@ -242,14 +191,15 @@ ViStatus HislipTransport::nextData(std::size_t &count, const os::WaitLimit &limi
         }
         case MessageType::Interrupted:
             count = 0;
-            ++m_interruptions;
+            if (!m_async->takeInterruption(header.parameter)) {
+                m_interrupted = header.parameter;
+                m_counterpartDue = os::Deadline::after(PatienceForCounterpart);
+            }
             break;
         case MessageType::FatalError:
             return checked(VI_ERROR_CONN_LOST);
         case MessageType::Error:
             return VI_ERROR_IO;
-        case MessageType::DeviceClearAcknowledge: // of a clear that was given up
-            break;
         default:
             if (const ViStatus status = refuse(header, limit); status < VI_SUCCESS)
                 return status;
@@ -272,12 +222,23 @@ ViStatus HislipTransport::beforeSending(const os::WaitLimit &limit)
 {
     if (!m_sync.isOpen())
         return VI_ERROR_CONN_LOST;
-    if (m_sync.messageIsHalfSent())
+    if (m_sync.messageIsHalfSent() && m_clearing == Clearing::No)
         return VI_ERROR_RAW_WR_PROT_VIOL;
+    if (const ViStatus status = finishClear(limit); status < VI_SUCCESS)
+        return status;
     if (m_overlapped)
         return VI_SUCCESS;
     m_inMessage = false; // what was not read of the last response is dropped
-    return m_interruptions > 0 ? checked(m_async->awaitInterruptions(m_interruptions, limit)) : VI_SUCCESS;
+    if (!m_interrupted)
+        return VI_SUCCESS;
+    const ViStatus status =
+        m_async->awaitInterruption(*m_interrupted, {limit.deadline.orEarlier(m_counterpartDue), limit.wakeup});
+    if (status == VI_ERROR_TMO && !m_counterpartDue.expired())
+        return status;
+    if (status != VI_SUCCESS && status != VI_ERROR_TMO)
+        return checked(status);
+    m_interrupted.reset();
+    return VI_SUCCESS;
 }
 
 ViStatus HislipTransport::write(std::span<const std::byte> data, const TransferMode &mode, const os::WaitLimit &limit,
@@ -289,10 +250,9 @@ ViStatus HislipTransport::write(std::span<const std::byte> data, const TransferM
         const auto payload = data.subspan(
             count, static_cast<std::size_t>(std::min<std::uint64_t>(data.size() - count, m_largestPayload)));
         const bool last = count + payload.size() == data.size();
-        const Header header{last && mode.sendEnd ? MessageType::DataEnd : MessageType::Data, takeDeliveredFlag(),
-                            takeNextId(), payload.size()};
         std::size_t sent = 0;
-        const IoResult result = m_sync.send(header, payload, limit, sent);
+        const IoResult result =
+            sendNumbered(last && mode.sendEnd ? MessageType::DataEnd : MessageType::Data, payload, limit, sent);
         count += sent;
         if (result != IoResult::Done)
             return ended(result, limit);
@@ -320,7 +280,7 @@ ViStatus HislipTransport::trigger(const TransferMode &, const os::WaitLimit &lim
     if (const ViStatus status = beforeSending(limit); status < VI_SUCCESS)
         return status;
     std::size_t sent = 0;
-    return ended(m_sync.send({MessageType::Trigger, takeDeliveredFlag(), takeNextId(), 0}, {}, limit, sent), limit);
+    return ended(sendNumbered(MessageType::Trigger, {}, limit, sent), limit);
 }
 
 ViStatus HislipTransport::clear(const os::WaitLimit &limit)
@@ -332,37 +292,88 @@ ViStatus HislipTransport::clearInto(bool overlapped, const os::WaitLimit &limit)
 {
     if (!m_sync.isOpen())
         return VI_ERROR_CONN_LOST;
-    if (const IoResult result = m_sync.finishMessage(limit); result != IoResult::Done)
-        return ended(result, limit);
-    HislipAsyncChannel::Reply reply;
-    const ViStatus status = m_async->transact({MessageType::AsyncDeviceClear, 0, 0, 0}, {},
-                                              MessageType::AsyncDeviceClearAcknowledge, reply, limit);
-    if (status < VI_SUCCESS)
-        return checked(status);
-
-    const std::uint8_t wanted = overlapped ? OverlapFlag : 0;
-    std::size_t sent = 0;
-    IoResult result = m_sync.send({MessageType::DeviceClearComplete, wanted, 0, 0}, {}, limit, sent);
-    m_inMessage = false;
-    Header header;
-    for (bool first = true; result == IoResult::Done; first = false) {
-        if (!first && limit.deadline.expired())
-            return VI_ERROR_TMO;
-        result = m_sync.next(header, limit);
-        if (result == IoResult::Done && header.type == MessageType::FatalError)
-            return checked(VI_ERROR_CONN_LOST);
-        if (result == IoResult::Done && header.type == MessageType::DeviceClearAcknowledge)
-            break;
+    if (m_clearing == Clearing::No) {
+        if (const IoResult finished = finishAsFarAsTaken(limit); finished != IoResult::Done)
+            return ended(finished, limit);
+        HislipAsyncChannel::Reply reply;
+        const ViStatus status = m_async->transact({MessageType::AsyncDeviceClear, 0, 0, 0}, {},
+                                                  MessageType::AsyncDeviceClearAcknowledge, reply, limit);
+        const bool underWay = status == VI_SUCCESS || m_async->awaits(MessageType::AsyncDeviceClearAcknowledge);
+        if (!underWay)
+            return checked(status);
+        m_clearing = status == VI_SUCCESS ? Clearing::Acknowledged : Clearing::Requested;
+        m_clearIntoOverlap = overlapped;
+        if (status < VI_SUCCESS)
+            return checked(status);
     }
-    if (result != IoResult::Done)
-        return ended(result, limit);
-    m_overlapped = (header.control & OverlapFlag) != 0;
+    m_clearIntoOverlap = m_clearing == Clearing::Completed ? m_clearIntoOverlap : overlapped;
+    return finishClear(limit);
+}
+
+/// Finishes a message that stopped in the middle, as long as the instrument takes it. One that does not look at its input,
+/// because of another client's lock for example, will begin to discard it when it is asked for the clear.
+IoResult HislipTransport::finishAsFarAsTaken(const os::WaitLimit &limit)
+{
+    for (;;) {
+        const std::uint64_t before = m_sync.unsent();
+        const auto patience = os::Deadline::after(PatienceForStillInput);
+        const IoResult result = m_sync.finishMessage({limit.deadline.orEarlier(patience), limit.wakeup});
+        if (result != IoResult::TimedOut || limit.deadline.expired())
+            return result;
+        if (m_sync.unsent() == before)
+            return IoResult::Done;
+    }
+}
+
+/// Goes on with a device clear that is under way, to its end.
+ViStatus HislipTransport::finishClear(const os::WaitLimit &limit)
+{
+    if (m_clearing == Clearing::Requested) {
+        const ViStatus status = m_async->awaitAnswers(MessageType::AsyncDeviceClearAcknowledge, limit);
+        if (status < VI_SUCCESS)
+            return checked(status);
+        m_clearing = Clearing::Acknowledged;
+    }
+    if (m_clearing == Clearing::Acknowledged) {
+        IoResult result = m_sync.finishMessage(limit);
+        std::size_t sent = 0;
+        const std::uint8_t wanted = m_clearIntoOverlap ? OverlapFlag : 0;
+        if (result == IoResult::Done)
+            result = m_sync.send({MessageType::DeviceClearComplete, wanted, 0, 0}, {}, limit, sent);
+        const bool begun = result == IoResult::Done || m_sync.messageIsHalfSent();
+        if (begun)
+            m_clearing = Clearing::Completed;
+        if (result != IoResult::Done)
+            return ended(result, limit);
+        m_inMessage = false;
+    }
+    if (m_clearing == Clearing::Completed) {
+        if (const IoResult result = m_sync.finishMessage(limit); result != IoResult::Done)
+            return ended(result, limit);
+        Header header;
+        for (bool first = true; header.type != MessageType::DeviceClearAcknowledge; first = false) {
+            if (!first && limit.deadline.expired())
+                return VI_ERROR_TMO;
+            if (const IoResult result = m_sync.next(header, limit); result != IoResult::Done)
+                return ended(result, limit);
+            if (header.type == MessageType::FatalError)
+                return checked(VI_ERROR_CONN_LOST);
+        }
+        cleared((header.control & OverlapFlag) != 0);
+    }
+    return VI_SUCCESS;
+}
+
+void HislipTransport::cleared(bool overlapped)
+{
+    m_clearing = Clearing::No;
+    m_overlapped = overlapped;
+    m_inMessage = false;
     m_nextId = FirstMessageId;
     m_lastDeliveredId = NothingSentId;
     m_deliveredToReport = false;
-    m_interruptions = 0;
-    m_async->forgetInterruptions();
-    return VI_SUCCESS;
+    m_interrupted.reset();
+    m_async->forgetPast();
 }
 
 ViStatus HislipTransport::controlRemote(ViUInt16 mode, const os::WaitLimit &limit)
@@ -398,7 +409,64 @@ ViStatus HislipTransport::applyAttribute(ViAttr attribute, ViUInt64 value, const
     }
 }
 
-ViStatus HislipTransport::watchServiceRequests(std::function<void()> notify)
+ViStatus HislipTransport::lockDevice(const std::string &key, std::chrono::milliseconds patience,
+                                     const os::WaitLimit &limit)
+{
+    enum : std::uint8_t { Failed = 0, Granted = 1 };
+    if (!m_sync.isOpen())
+        return VI_ERROR_CONN_LOST;
+    std::uint8_t answer = Failed;
+    const ViStatus status = m_async->requestLock(patience, std::as_bytes(std::span(key)), lastSentId(), answer, limit);
+    if (status < VI_SUCCESS)
+        return checked(status);
+    if (answer == Failed)
+        return VI_ERROR_RSRC_LOCKED;
+    if (answer != Granted) // "error": the instrument takes it for held, or cannot lock
+        return VI_ERROR_IO;
+    (key.empty() ? m_holdsExclusive : m_holdsShared) = true;
+    return VI_SUCCESS;
+}
+
+ViStatus HislipTransport::unlockDevice(const os::WaitLimit &limit)
+{
+    enum : std::uint8_t { ExclusiveReleased = 1, SharedReleased = 2 };
+    if (!m_sync.isOpen())
+        return VI_ERROR_CONN_LOST;
+    (m_holdsExclusive ? m_holdsExclusive : m_holdsShared) = false;
+    std::uint8_t answer = 0;
+    const ViStatus status = m_async->releaseLock(lastSentId(), answer, limit);
+    if (status < VI_SUCCESS)
+        return checked(status);
+    return answer == ExclusiveReleased || answer == SharedReleased ? VI_SUCCESS : VI_ERROR_IO;
+}
+
+ViStatus HislipTransport::readLockState(const os::WaitLimit &limit, ViAccessMode &state)
+{
+    if (!m_sync.isOpen())
+        return VI_ERROR_CONN_LOST;
+    HislipAsyncChannel::Reply reply;
+    const ViStatus status =
+        m_async->transact({MessageType::AsyncLockInfo, 0, 0, 0}, {}, MessageType::AsyncLockInfoResponse, reply, limit);
+    if (status < VI_SUCCESS)
+        return checked(status);
+    state = VI_NO_LOCK;
+    if ((reply.header.control & ExclusiveGranted) != 0)
+        state = VI_EXCLUSIVE_LOCK;
+    else if (reply.header.parameter > 0)
+        state = VI_SHARED_LOCK;
+    return VI_SUCCESS;
+}
+
+bool HislipTransport::lockedByAnother(const os::Wakeup &wakeup)
+{
+    if (m_holdsExclusive || !m_tellsLocks)
+        return false;
+    ViAccessMode state = VI_NO_LOCK;
+    m_tellsLocks = readLockState({os::Deadline::after(PatienceForLockInfo), wakeup}, state) == VI_SUCCESS;
+    return state == VI_EXCLUSIVE_LOCK || (state == VI_SHARED_LOCK && !m_holdsShared);
+}
+
+ViStatus HislipTransport::watchServiceRequests(std::function<void()> notify, const os::WaitLimit &)
 {
     return m_sync.isOpen() ? m_async->watch(std::move(notify)) : VI_ERROR_CONN_LOST;
 }

@@ -1,16 +1,14 @@
 #pragma once
 
-#include "kyvisa/core/ResourceName.h"
 #include "kyvisa/transport/HislipAsyncChannel.h"
 #include "kyvisa/transport/HislipChannel.h"
 #include "kyvisa/transport/Transport.h"
 
 #include <memory>
+#include <optional>
 
 namespace kyvisa
 {
-
-class AttributeStore;
 
 /**
  * HiSLIP (IVI-6.1), protocol 1.0, synchronized and overlapped mode.
@@ -19,16 +17,18 @@ class AttributeStore;
  * one: what was asked before, timed out or was interrupted is dropped on arrival. In overlapped mode responses are kept in
  * order until they are read.
  *
+ * A device clear that ran into its time-out is finished before anything else is sent or read: until the instrument has seen
+ * its end, it discards what comes.
+ *
  * The synchronous connection belongs to the calling thread. See HislipAsyncChannel for the other one.
  */
 class HislipTransport : public Transport
 {
 public:
-    /// Opens both connections and agrees on the sizes of messages.
-    static ViStatus connect(const ResourceName &name, const os::WaitLimit &limit, AttributeStore &attributes,
-                            std::unique_ptr<Transport> &transport);
-
     HislipTransport(HislipChannel sync, std::unique_ptr<HislipAsyncChannel> async, bool overlapped);
+
+    /// Tells each other the largest message.
+    ViStatus agreeOnSizes(ViUInt64 largestToUs, const os::WaitLimit &limit);
 
     ViStatus read(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
                   std::size_t &count) override;
@@ -39,14 +39,26 @@ public:
     ViStatus clear(const os::WaitLimit &limit) override;
     ViStatus controlRemote(ViUInt16 mode, const os::WaitLimit &limit) override;
     ViStatus applyAttribute(ViAttr attribute, ViUInt64 value, const os::WaitLimit &limit) override;
-    ViStatus watchServiceRequests(std::function<void()> notify) override;
-    bool deviceHasLocks() const override { return true; }
+    ViStatus watchServiceRequests(std::function<void()> notify, const os::WaitLimit &limit) override;
+    DeviceLocks deviceLocks() const override { return DeviceLocks::All; }
+    ViStatus lockDevice(const std::string &key, std::chrono::milliseconds patience,
+                        const os::WaitLimit &limit) override;
+    ViStatus unlockDevice(const os::WaitLimit &limit) override;
+    ViStatus readLockState(const os::WaitLimit &limit, ViAccessMode &state) override;
     void close() override;
     void abandon() override;
 
 private:
-    ViStatus agreeOnSizes(ViUInt64 largestToUs, const os::WaitLimit &limit);
+    /// How far a device clear has come.
+    enum class Clearing { No, Requested, Acknowledged, Completed };
+
     ViStatus clearInto(bool overlapped, const os::WaitLimit &limit);
+    os::IoResult finishAsFarAsTaken(const os::WaitLimit &limit);
+    ViStatus finishClear(const os::WaitLimit &limit);
+    void cleared(bool overlapped);
+    ViStatus readResponse(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
+                          std::size_t &count);
+    bool lockedByAnother(const os::Wakeup &wakeup);
     ViStatus nextData(std::size_t &count, const os::WaitLimit &limit);
     ViStatus deliver(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
                      std::size_t &count);
@@ -56,7 +68,8 @@ private:
     ViStatus checked(ViStatus status);
 
     std::uint32_t lastSentId() const { return m_nextId - 2; }
-    std::uint32_t takeNextId();
+    os::IoResult sendNumbered(wire::hislip::MessageType type, std::span<const std::byte> payload,
+                              const os::WaitLimit &limit, std::size_t &sent);
     std::uint8_t takeDeliveredFlag();
 
     HislipChannel m_sync;
@@ -71,7 +84,16 @@ private:
     bool m_inMessage = false;   ///< between the header of a response's message and its last byte
     bool m_messageEnds = false; ///< that message carries the END
     std::uint32_t m_messageId = 0;
-    unsigned m_interruptions = 0; ///< Interrupted messages; each has a counterpart on the other connection
+
+    std::optional<std::uint32_t>
+        m_interrupted; ///< Interrupted has come; its counterpart on the other connection has not
+    os::Deadline m_counterpartDue = os::Deadline::never();
+    Clearing m_clearing = Clearing::No;
+    bool m_clearIntoOverlap = false;
+
+    bool m_holdsExclusive = false; ///< of the instrument's locks
+    bool m_holdsShared = false;
+    bool m_tellsLocks = true; ///< as far as is known, the instrument answers AsyncLockInfo
 };
 
 } // namespace kyvisa

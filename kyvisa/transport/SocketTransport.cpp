@@ -2,10 +2,10 @@
 
 #include "kyvisa/include/visa.h"
 #include "kyvisa/transport/IoStatus.h"
+#include "kyvisa/transport/StringProtocol.h"
 
 #include <algorithm>
 #include <array>
-#include <charconv>
 #include <cstring>
 
 namespace kyvisa
@@ -14,7 +14,6 @@ namespace
 {
 
 constexpr std::size_t InputCapacity = 64 * 1024;
-constexpr std::size_t LongestStatusAnswer = 64;
 
 } // namespace
 
@@ -90,43 +89,25 @@ ViStatus SocketTransport::write(std::span<const std::byte> data, const TransferM
     return ended(sent.result, limit);
 }
 
-ViStatus SocketTransport::sendText(std::string_view text, const os::WaitLimit &limit)
-{
-    std::size_t count = 0;
-    return write(std::as_bytes(std::span(text)), {}, limit, count);
-}
-
 ViStatus SocketTransport::readStatusByte(const TransferMode &mode, const os::WaitLimit &limit, ViUInt16 &status)
 {
     if (mode.protocol != VI_PROT_4882_STRS)
         return VI_ERROR_INV_SETUP;
-    if (const ViStatus sent = sendText("*STB?\n", limit); sent < VI_SUCCESS)
-        return sent;
-    std::array<char, LongestStatusAnswer> answer{};
-    TransferMode line;
-    line.termCharEnabled = true;
-    std::size_t count = 0;
-    const ViStatus got = read(std::as_writable_bytes(std::span(answer)), line, limit, count);
-    if (got < VI_SUCCESS)
-        return got;
-    if (got != VI_SUCCESS_TERM_CHAR) {
-        m_answerMayBeLate = true; // what is left of the line is nobody's answer
-        return VI_ERROR_RAW_RD_PROT_VIOL;
-    }
-    const char *first = answer.data(); // a line that ends by its '\n': neither loop nor comparison leaves it
-    while (*first == ' ' || *first == '+')
-        ++first;
-    unsigned value = 0;
-    const auto [end, error] = std::from_chars(first, answer.data() + count, value);
-    if (error != std::errc() || value > 0xFF || (*end != '\n' && *end != '\r'))
-        return VI_ERROR_RAW_RD_PROT_VIOL;
-    status = static_cast<ViUInt16>(value);
-    return VI_SUCCESS;
+    const ViStatus result = queryStatusByte(*this, limit, status);
+    m_answerMayBeLate = m_answerMayBeLate || result == VI_ERROR_RAW_RD_PROT_VIOL; // the rest is nobody's answer
+    return result;
 }
 
 ViStatus SocketTransport::trigger(const TransferMode &mode, const os::WaitLimit &limit)
 {
-    return mode.protocol == VI_PROT_4882_STRS ? sendText("*TRG\n", limit) : VI_ERROR_INV_SETUP;
+    return mode.protocol == VI_PROT_4882_STRS ? sendTrigger(*this, limit) : VI_ERROR_INV_SETUP;
+}
+
+ViStatus SocketTransport::flushLine(ViUInt16 mask, const os::WaitLimit &limit)
+{
+    if ((mask & (VI_IO_IN_BUF | VI_IO_IN_BUF_DISCARD)) == 0)
+        return VI_SUCCESS; // what was sent is the system's
+    return dropInput(limit) ? VI_SUCCESS : VI_ERROR_CONN_LOST;
 }
 
 ViStatus SocketTransport::clear(const os::WaitLimit &limit)

@@ -26,12 +26,12 @@ public:
     ViStatus trigger(const TransferMode &mode, const os::WaitLimit &limit) override;
     ViStatus clear(const os::WaitLimit &limit) override;
     ViStatus applyAttribute(ViAttr attribute, ViUInt64 value, const os::WaitLimit &limit) override;
+    ViStatus flushLine(ViUInt16 mask, const os::WaitLimit &limit) override;
     void close() override;
     void abandon() override;
 
 private:
     ViStatus ended(os::IoResult result, const os::WaitLimit &limit);
-    ViStatus sendText(std::string_view text, const os::WaitLimit &limit);
     bool dropInput(const os::WaitLimit &limit);
 
     os::StreamSocket m_socket;

@@ -15,9 +15,39 @@ ViStatus Transport::applyAttribute(ViAttr, ViUInt64, const os::WaitLimit &)
     return VI_SUCCESS;
 }
 
-ViStatus Transport::watchServiceRequests(std::function<void()>)
+bool Transport::isLive(ViAttr) const
+{
+    return false;
+}
+
+ViStatus Transport::readAttribute(ViAttr, const os::WaitLimit &, ViUInt64 &)
+{
+    return VI_ERROR_NSUP_ATTR;
+}
+
+ViStatus Transport::flushLine(ViUInt16, const os::WaitLimit &)
+{
+    return VI_SUCCESS;
+}
+
+ViStatus Transport::watchServiceRequests(std::function<void()>, const os::WaitLimit &)
 {
     return VI_ERROR_INV_EVENT;
+}
+
+ViStatus Transport::lockDevice(const std::string &, std::chrono::milliseconds, const os::WaitLimit &)
+{
+    return VI_ERROR_NSUP_OPER;
+}
+
+ViStatus Transport::unlockDevice(const os::WaitLimit &)
+{
+    return VI_ERROR_NSUP_OPER;
+}
+
+ViStatus Transport::readLockState(const os::WaitLimit &, ViAccessMode &)
+{
+    return VI_ERROR_NSUP_OPER;
 }
 
 } // namespace kyvisa

@@ -2,9 +2,12 @@
 
 #include "kyvisa/include/visatype.h"
 
+#include <chrono>
 #include <cstddef>
+#include <cstdint>
 #include <functional>
 #include <span>
+#include <string>
 
 namespace kyvisa
 {
@@ -14,6 +17,7 @@ namespace os
 struct WaitLimit;
 }
 class AttributeStore;
+class GpibController;
 
 /// What ends a read, and the protocol of status and trigger.
 struct TransferMode {
@@ -22,6 +26,13 @@ struct TransferMode {
     bool suppressEnd = false;
     bool sendEnd = true;
     ViUInt16 protocol = 1; ///< VI_ATTR_IO_PROT
+};
+
+/// Which locks an instrument keeps itself, so that they hold for clients of other machines too.
+enum class DeviceLocks : std::uint8_t {
+    None,      ///< none: the library's own locks hold on this machine
+    Exclusive, ///< the exclusive one; it is taken on top of the library's own
+    All,       ///< exclusive and shared ones, and it enforces them
 };
 
 /**
@@ -51,11 +62,32 @@ public:
     /// Carries out a new value of an attribute that means something to the connection, before it is stored.
     virtual ViStatus applyAttribute(ViAttr attribute, ViUInt64 value, const os::WaitLimit &limit);
 
-    /// From now on @p notify is called, on a thread of the transport, for each service request. May be called again.
-    virtual ViStatus watchServiceRequests(std::function<void()> notify);
+    /// The attribute's value is the instrument's: it is asked each time.
+    virtual bool isLive(ViAttr attribute) const;
+    /// Asks for a live attribute.
+    virtual ViStatus readAttribute(ViAttr attribute, const os::WaitLimit &limit, ViUInt64 &value);
+    /// viFlush() of the system's buffers. @param mask VI_IO_IN_BUF, VI_IO_OUT_BUF and their _DISCARD.
+    virtual ViStatus flushLine(ViUInt16 mask, const os::WaitLimit &limit);
 
-    /// The instrument has locks of its own, so blocked operations wait for the time-out before they give up.
-    virtual bool deviceHasLocks() const { return false; }
+    /// What a session on a GPIB interface can do beside transfers; nullptr for everything else.
+    virtual GpibController *gpibController() { return nullptr; }
+
+    /// From now on @p notify is called, on a thread of the transport, for each service request. May be called again.
+    virtual ViStatus watchServiceRequests(std::function<void()> notify, const os::WaitLimit &limit);
+
+    virtual DeviceLocks deviceLocks() const { return DeviceLocks::None; }
+    /**
+     * Asks the instrument for the exclusive lock (empty @p key) or a shared one, and lets it wait up to @p patience for that.
+     * VI_ERROR_RSRC_LOCKED when another client held it all the time. @p limit leaves time for the way there and back; a call
+     * that it ends sees to it that a lock which is granted too late is given back.
+     *
+     * Only asked for what the session does not hold yet.
+     */
+    virtual ViStatus lockDevice(const std::string &key, std::chrono::milliseconds patience, const os::WaitLimit &limit);
+    /// Gives back the exclusive lock, or when the session has none the shared one.
+    virtual ViStatus unlockDevice(const os::WaitLimit &limit);
+    /// What the instrument's clients hold. @param state VI_NO_LOCK, VI_EXCLUSIVE_LOCK or VI_SHARED_LOCK.
+    virtual ViStatus readLockState(const os::WaitLimit &limit, ViAccessMode &state);
 
     virtual void close() = 0;
     /// Instead of close() in a forked child: frees descriptors, tells nobody, takes no lock.

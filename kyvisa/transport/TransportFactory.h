@@ -3,6 +3,7 @@
 #include "kyvisa/core/ResourceName.h"
 
 #include <memory>
+#include <vector>
 
 namespace kyvisa
 {
@@ -12,10 +13,16 @@ namespace os
 struct WaitLimit;
 }
 class AttributeStore;
+struct Configuration;
 class Transport;
 
-/// The name with the protocol decided: without a device name it becomes that of the protocol that will be used.
-ResourceName withTransportChosen(ResourceName name);
+/// The names under which to open it, best first. A LAN instrument without a device name may be meant in either protocol.
+/// A GPIB name gets the gateway that the configuration has for its board.
+std::vector<ResourceName> transportChoices(const ResourceName &name, const Configuration &configuration);
+
+/// By what the processes of this machine know the resource when they lock it: the name, and the way to it where the name alone
+/// does not say that.
+std::string lockName(const ResourceName &name);
 
 /// The kind of session (AttributeTable.h) that a resource makes; 0 where this library has no transport for it, with the
 /// status that says so in @p status.

@@ -84,22 +84,39 @@ Parameter &Arguments::take()
     return m_parameters[m_next++];
 }
 
+double Arguments::limit(const Parameter &parameter, const Numeric &range)
+{
+    if (parameter.kind != Kind::Character)
+        refuse(parameter);
+    if (isForm(parameter.text, "MINimum"))
+        return range.least;
+    if (isForm(parameter.text, "MAXimum"))
+        return range.most;
+    if (isForm(parameter.text, "DEFault"))
+        return range.initial;
+    if (isForm(parameter.text, "INFinity") || isForm(parameter.text, "NINFinity"))
+        throw ScpiError{-222, parameter.text};
+    refuse(parameter);
+}
+
+double Arguments::limit(const Numeric &range)
+{
+    return limit(take(), range);
+}
+
+std::int64_t Arguments::whole(const Numeric &range)
+{
+    Numeric rounded = range;
+    rounded.least -= 0.49;
+    rounded.most += 0.49;
+    return std::llround(std::clamp(number(rounded), range.least, range.most));
+}
+
 double Arguments::number(const Numeric &range)
 {
     const Parameter &parameter = take();
-    if (parameter.kind == Kind::Character) {
-        if (isForm(parameter.text, "MINimum"))
-            return range.least;
-        if (isForm(parameter.text, "MAXimum"))
-            return range.most;
-        if (isForm(parameter.text, "DEFault"))
-            return range.initial;
-        if (isForm(parameter.text, "INFinity") || isForm(parameter.text, "NINFinity"))
-            throw ScpiError{-222, parameter.text};
-        refuse(parameter);
-    }
     if (parameter.kind != Kind::Number)
-        refuse(parameter);
+        return limit(parameter, range);
     const double value = parameter.number * factorOf(parameter.suffix, range.unit);
     if (!(value >= range.least && value <= range.most))
         throw ScpiError{-222, {}};
@@ -136,7 +153,8 @@ bool Arguments::boolean()
     return std::round(parameter.number) != 0;
 }
 
-std::size_t Arguments::choice(std::initializer_list<std::string_view> choices)
+template <typename Choices>
+std::size_t Arguments::chosen(const Choices &choices)
 {
     const Parameter &parameter = take();
     if (parameter.kind != Kind::Character)
@@ -146,6 +164,24 @@ std::size_t Arguments::choice(std::initializer_list<std::string_view> choices)
     if (found == choices.end())
         throw ScpiError{-224, parameter.text};
     return static_cast<std::size_t>(found - choices.begin());
+}
+
+std::size_t Arguments::choice(std::initializer_list<std::string_view> choices)
+{
+    return chosen(choices);
+}
+
+std::size_t Arguments::choice(std::span<const std::string> choices)
+{
+    return chosen(choices);
+}
+
+bool Arguments::isWord(std::string_view pattern)
+{
+    if (!more() || m_parameters[m_next].kind != Kind::Character || !isForm(m_parameters[m_next].text, pattern))
+        return false;
+    ++m_next;
+    return true;
 }
 
 std::string Arguments::string()

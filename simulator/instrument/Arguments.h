@@ -6,6 +6,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <initializer_list>
+#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -34,15 +35,25 @@ public:
 
     bool more() const { return m_next < m_parameters.size(); }
     double number(const Numeric &range);
+    /// As number(), for whole numbers; others are rounded.
+    std::int64_t whole(const Numeric &range);
+    /// What stands behind a query: MINimum, MAXimum or DEFault, and nothing else.
+    double limit(const Numeric &range);
     std::int64_t integer(std::int64_t least, std::int64_t most);
     bool boolean();
     /// Index of the mnemonic in @p choices, written like "IMMediate".
     std::size_t choice(std::initializer_list<std::string_view> choices);
+    std::size_t choice(std::span<const std::string> choices);
+    /// Takes the next parameter if it is this word, written like "IMMediate".
+    bool isWord(std::string_view pattern);
     std::string string();
     Bytes block();
 
 private:
     Parameter &take();
+    template <typename Choices>
+    std::size_t chosen(const Choices &choices);
+    static double limit(const Parameter &parameter, const Numeric &range);
 
     std::vector<Parameter> m_parameters;
     std::size_t m_next = 0;

@@ -30,4 +30,9 @@ constexpr char toUpper(char c)
     return c >= 'a' && c <= 'z' ? static_cast<char>(c - 'a' + 'A') : c;
 }
 
+constexpr char toLower(char c)
+{
+    return isUpper(c) ? static_cast<char>(c - 'A' + 'a') : c;
+}
+
 } // namespace simulator

@@ -49,6 +49,16 @@ bool names(const CommandTable::Node &node, std::string_view sent, unsigned &suff
     return equalIgnoringCase(word, whole) || equalIgnoringCase(word, whole.substr(0, node.shortLength));
 }
 
+/// True when only the numeric suffix is in the way: the mnemonic takes none.
+bool isOtherwiseKnown(const CommandTable::Node &parent, std::string_view sent)
+{
+    const std::size_t letters = sent.find_last_not_of("0123456789") + 1;
+    unsigned suffix = 1;
+    return letters < sent.size() && std::any_of(parent.children.begin(), parent.children.end(), [&](const auto &child) {
+               return names(*child, sent.substr(0, letters), suffix);
+           });
+}
+
 } // namespace
 
 /// The child that the pattern's mnemonic names, made when it is new.
@@ -112,6 +122,27 @@ void CommandTable::addBelow(Node &node, std::string_view rest, bool query, const
     addBelow(node.child(mnemonic), rest, query, entry);
 }
 
+std::vector<std::string> CommandTable::headers() const
+{
+    std::vector<std::string> result;
+    collect(*m_common, "*", result);
+    collect(*m_root, "", result);
+    return result;
+}
+
+void CommandTable::collect(const Node &node, const std::string &path, std::vector<std::string> &headers)
+{
+    for (const auto &child : node.children) {
+        std::string mnemonic = child->longForm;
+        std::transform(mnemonic.begin() + static_cast<std::ptrdiff_t>(child->shortLength), mnemonic.end(),
+                       mnemonic.begin() + static_cast<std::ptrdiff_t>(child->shortLength), toLower);
+        const std::string header = path + mnemonic + (child->takesSuffix ? "#" : "");
+        if (child->set || child->query)
+            headers.push_back(header);
+        collect(*child, header + ":", headers);
+    }
+}
+
 CommandTable::Match CommandTable::find(const CommandHeader &header, const Node *path,
                                        const std::vector<unsigned> &pathSuffixes) const
 {
@@ -132,7 +163,7 @@ CommandTable::Match CommandTable::find(const CommandHeader &header, const Node *
         const auto next = std::find_if(node->children.begin(), node->children.end(),
                                        [&](const auto &child) { return names(*child, mnemonic, suffix); });
         if (next == node->children.end())
-            throw ScpiError{-113, std::string{header.text}};
+            throw ScpiError{isOtherwiseKnown(*node, mnemonic) ? -114 : -113, std::string{header.text}};
         node = next->get();
         if (node->takesSuffix)
             match.suffixes.push_back(suffix);

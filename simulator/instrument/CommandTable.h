@@ -55,10 +55,14 @@ public:
     /// A later entry replaces an earlier one of the same header.
     void add(std::string_view pattern, Arity arity, Handler handler);
 
-    /// Finds the header, first at @p path unless it is absolute or common. Throws ScpiError -113 when there is none.
+    /// Finds the header, from @p path on unless it is absolute or common. Throws ScpiError -113 when there is none, -114 for a suffix too many.
     Match find(const CommandHeader &header, const Node *path, const std::vector<unsigned> &pathSuffixes) const;
 
+    /// All headers, written as in patterns, without `?`.
+    std::vector<std::string> headers() const;
+
 private:
+    static void collect(const Node &node, const std::string &path, std::vector<std::string> &headers);
     void addBelow(Node &node, std::string_view rest, bool query, const std::shared_ptr<const Entry> &entry);
 
     std::unique_ptr<Node> m_root;

@@ -1,7 +1,10 @@
 #include "simulator/instrument/Command.h"
 #include "simulator/instrument/Commands.h"
 
+#include <array>
 #include <chrono>
+#include <locale>
+#include <sstream>
 
 namespace simulator
 {
@@ -23,10 +26,17 @@ void reset(Command &command)
     command.instrument.reset();
 }
 
+void identify(Command &command)
+{
+    const Identification &own = command.instrument.identification();
+    command.response.arbitrary(own.manufacturer + "," + own.model + "," + own.serial + "," + own.firmware);
+}
+
 void save(Command &command)
 {
     const auto index = static_cast<std::size_t>(command.arguments.integer(0, Instrument::Memories - 1));
-    command.instrument.memories[index] = command.instrument.sourceMeasure.settings();
+    command.instrument.memories[index] = {command.instrument.sourceMeasure.settings(),
+                                          command.instrument.profileSettings};
 }
 
 void recall(Command &command)
@@ -35,8 +45,32 @@ void recall(Command &command)
     const auto &memory = command.instrument.memories[index];
     if (!memory)
         throw ScpiError{-224, "nothing saved"};
-    command.instrument.sourceMeasure.abort();
-    command.instrument.sourceMeasure.apply(*memory);
+    command.instrument.sourceMeasure.apply(memory->settings);
+    command.instrument.profileSettings = memory->profileSettings;
+}
+
+/// Program message units that bring back all settings.
+void learn(Command &command)
+{
+    const SourceMeasure::Settings settings = command.instrument.sourceMeasure.settings();
+    const AcquisitionSettings &acquisition = settings.acquisition;
+    constexpr std::array Sources{"IMM", "BUS", "HOLD"};
+    std::ostringstream units;
+    units.imbue(std::locale::classic());
+    units << std::scientific << std::uppercase << "*RST";
+    if (command.instrument.learnProfile)
+        units << command.instrument.learnProfile();
+    if (!command.instrument.options().sourceMeasure)
+        return command.response.arbitrary(units.str());
+    for (std::size_t i = 0; i < settings.channels.size(); ++i) {
+        const ChannelSettings &channel = settings.channels.at(i);
+        units << ";:SOUR" << i + 1 << ":VOLT " << channel.voltage << ";CURR " << channel.currentLimit << ";CURR:PROT "
+              << channel.protection << ";:OUTP" << i + 1 << ' ' << channel.output;
+    }
+    units << ";:TRIG:SOUR " << Sources.at(static_cast<std::size_t>(acquisition.source)) << ";DEL " << acquisition.delay
+          << ";COUN " << acquisition.triggers << ";:SAMP:COUN " << acquisition.samples << ";:SENS:APER "
+          << acquisition.aperture << ";:INIT:CONT " << acquisition.continuous;
+    command.response.arbitrary(units.str());
 }
 
 void addStatusByteCommands(CommandTable &table)
@@ -71,8 +105,9 @@ void addCommonCommands(CommandTable &table)
 {
     addStatusByteCommands(table);
     addSynchronisationCommands(table);
-    table.add("*IDN?", {}, [](Command &c) { c.response.arbitrary(c.instrument.identification()); });
+    table.add("*IDN?", {}, identify);
     table.add("*OPT?", {}, [](Command &c) { c.response.arbitrary("0"); });
+    table.add("*LRN?", {}, learn);
     table.add("*RST", {}, reset);
     table.add("*SAV", {1, 1}, save);
     table.add("*RCL", {1, 1}, recall);

@@ -5,12 +5,14 @@
 namespace simulator
 {
 
-void ErrorQueue::push(ScpiError error)
+bool ErrorQueue::push(ScpiError error)
 {
-    if (m_errors.size() < Capacity)
-        m_errors.push_back(std::move(error));
-    else
-        m_errors.back() = {-350, {}};
+    if (m_errors.size() == m_capacity) {
+        m_errors.back() = {Overflow, {}};
+        return false;
+    }
+    m_errors.push_back(std::move(error));
+    return true;
 }
 
 ScpiError ErrorQueue::pop()
@@ -22,7 +24,12 @@ ScpiError ErrorQueue::pop()
     return oldest;
 }
 
-std::string errorResponse(const ScpiError &error)
+std::string errorNumber(int number, bool withSign)
+{
+    return (withSign && number >= 0 ? "+" : "") + std::to_string(number);
+}
+
+std::string errorResponse(const ScpiError &error, bool withSign)
 {
     constexpr std::size_t MaxText = 255;
     std::string text{errorText(error.number)};
@@ -38,7 +45,7 @@ std::string errorResponse(const ScpiError &error)
         if (text.size() >= MaxText - 1)
             break; // one short of the limit, so that a doubled quote fits
     }
-    return std::to_string(error.number) + ",\"" + text + "\"";
+    return errorNumber(error.number, withSign) + ",\"" + text + "\"";
 }
 
 } // namespace simulator

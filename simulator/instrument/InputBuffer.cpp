@@ -134,7 +134,10 @@ bool InputBuffer::blockHeader(char c)
 void InputBuffer::beginBlock(std::uint64_t length, State state)
 {
     m_unit.text.resize(std::min(m_unit.text.size(), m_headerAt + 1));
-    m_unit.blocks.push_back({m_headerAt, Bytes(m_budget)});
+    if (m_unit.blocks.size() < MessageUnit::MaxBlocks)
+        m_unit.blocks.push_back({m_headerAt, Bytes(m_budget)});
+    else
+        m_unit.overrun = true; // what comes is read and thrown away
     m_blockLength = length;
     m_state = state;
     m_quote = 0;

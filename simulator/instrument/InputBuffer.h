@@ -21,9 +21,11 @@ struct Block {
 
 /// One program message unit: what stands between `;` or terminators.
 struct MessageUnit {
-    std::string text; ///< without leading white space; a block is a single '#'
-    std::vector<Block> blocks;
-    bool overrun = false; ///< longer than the limits: text is incomplete
+    static constexpr std::size_t MaxBlocks = 1024;
+
+    std::string text;          ///< without leading white space; a block is a single '#'
+    std::vector<Block> blocks; ///< at most MaxBlocks
+    bool overrun = false;      ///< beyond the limits: text or blocks are incomplete
 };
 
 struct InputLimits {

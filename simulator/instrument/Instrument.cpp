@@ -6,28 +6,52 @@
 namespace simulator
 {
 
+void addBuiltInCommands(CommandTable &table, bool sourceMeasure)
+{
+    addCommonCommands(table);
+    addSystemCommands(table);
+    addStatusCommands(table);
+    if (sourceMeasure) {
+        addSourceMeasureCommands(table);
+        addAcquisitionCommands(table);
+    }
+    addDisplayCommands(table);
+    addMassMemoryCommands(table);
+    addPowerCommands(table);
+    addFaultCommands(table);
+}
+
 Instrument::Instrument(Timers &clock, InstrumentOptions options)
-    : timers(clock), operations(clock), locks(clock), massMemory(options.massMemory),
-      sourceMeasure(clock, operations, status, options.seed),
+    : timers(clock), errors(options.errorQueue), operations(clock), locks(clock), massMemory(options.massMemory),
+      sourceMeasure(clock, operations, status, options.seed), faults(options.seed, [this] { fillErrors(); }),
       // Room for what is stored and for two messages of the largest size on their way in.
       blocks(std::make_shared<ByteBudget>(options.massMemory + 2 * options.maxMessage)), m_options(std::move(options))
 {
-    addCommonCommands(commands);
-    addSystemCommands(commands);
-    addStatusCommands(commands);
-    addSourceMeasureCommands(commands);
-    addMassMemoryCommands(commands);
+    addBuiltInCommands(commands, m_options.sourceMeasure);
 }
 
-std::string Instrument::identification() const
+Instrument::~Instrument()
 {
-    return "Oltrava,KyVisaSimulator," + m_options.serial + "," + m_options.version;
+    timers.cancel(m_publishTimer);
 }
 
 void Instrument::report(const ScpiError &error)
 {
     status.setEvent(eventOfError(error.number));
-    errors.push(error);
+    if (!errors.push(error))
+        status.setEvent(eventOfError(ErrorQueue::Overflow));
+}
+
+/// A fault: errors until the queue has overflown. Clients see it a moment later, since one of them is being answered just now.
+void Instrument::fillErrors()
+{
+    for (std::size_t i = 0; i <= m_options.errorQueue; ++i)
+        report({-310, {}});
+    if (m_publishTimer == Timers::None)
+        m_publishTimer = timers.after({}, [this] {
+            m_publishTimer = Timers::None;
+            publishStatus();
+        });
 }
 
 void Instrument::publishStatus()
@@ -38,8 +62,22 @@ void Instrument::publishStatus()
 
 void Instrument::reset()
 {
-    sourceMeasure.abort();
     sourceMeasure.apply({});
+    displayText.clear();
+    profileSettings = profileDefaults;
+}
+
+void Instrument::powerCycle()
+{
+    for (MessageExchange *exchange : m_exchanges)
+        exchange->forgetOperationComplete();
+    reset();
+    remote = {};
+    errors.clear();
+    status.clearEvents();
+    // No reason for service is left: having been off is a new one.
+    publishStatus();
+    status.powerOn(powerOnClear);
 }
 
 } // namespace simulator

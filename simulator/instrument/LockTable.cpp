@@ -8,9 +8,9 @@
 namespace simulator
 {
 
-LockTable::Owner LockTable::join(std::function<void()> changed)
+LockTable::Owner LockTable::join(std::function<void()> changed, TrafficLog::Client *traffic)
 {
-    m_clients.emplace(++m_lastOwner, Client{std::move(changed)});
+    m_clients.emplace(++m_lastOwner, Client{std::move(changed), traffic});
     return m_lastOwner;
 }
 
@@ -25,16 +25,35 @@ void LockTable::leave(Owner owner)
     m_clients.erase(owner);
 }
 
+void LockTable::tell(Owner owner, const std::string &key, Answer answer) const
+{
+    if (TrafficLog::Client *traffic = m_clients.at(owner).traffic)
+        traffic->lock("lock", key,
+                      answer == Answer::Granted  ? "granted"
+                      : answer == Answer::Failed ? "not granted"
+                                                 : "held or asked for already");
+}
+
+void LockTable::tellRelease(Owner owner, const std::string &key) const
+{
+    if (TrafficLog::Client *traffic = m_clients.at(owner).traffic)
+        traffic->lock("unlock", key, {});
+}
+
 void LockTable::request(Owner owner, const std::string &key, std::chrono::milliseconds timeout, AnswerAction answer)
 {
     const Client &client = m_clients.at(owner);
+    const auto told = [&](Answer result) {
+        tell(owner, key, result);
+        answer(result);
+    };
     const bool held = m_exclusive == owner || (!key.empty() && client.shares);
     if (held || waitOf(owner) != m_waits.end())
-        return answer(Answer::Error);
+        return told(Answer::Error);
     if (grant(owner, key))
-        return answer(Answer::Granted);
+        return told(Answer::Granted);
     if (timeout.count() <= 0)
-        return answer(Answer::Failed);
+        return told(Answer::Failed);
     const Timers::Id timer = m_timers.after(timeout, [this, owner] { endWait(owner); });
     m_waits.push_back({owner, key, timer, std::move(answer)});
 }
@@ -46,6 +65,7 @@ void LockTable::endWait(Owner owner)
         return;
     m_timers.cancel(wait->timer);
     const AnswerAction answer = std::move(wait->answer);
+    tell(owner, wait->key, Answer::Failed);
     m_waits.erase(wait);
     answer(Answer::Failed);
 }
@@ -54,6 +74,7 @@ LockTable::Released LockTable::release(Owner owner)
 {
     if (m_exclusive == owner) {
         m_exclusive = NoOwner;
+        tellRelease(owner, {});
         changed();
         return Released::Exclusive;
     }
@@ -62,6 +83,7 @@ LockTable::Released LockTable::release(Owner owner)
         return Released::Nothing;
     client.shares = false;
     --m_sharers;
+    tellRelease(owner, m_key);
     changed();
     return Released::Shared;
 }
@@ -102,6 +124,7 @@ void LockTable::tellChange()
         }
         m_timers.cancel(wait->timer);
         const AnswerAction answer = std::move(wait->answer);
+        tell(wait->owner, wait->key, Answer::Granted);
         m_waits.erase(wait);
         answer(Answer::Granted);
         wait = m_waits.begin(); // the answer may have changed the list

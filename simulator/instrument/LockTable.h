@@ -1,5 +1,7 @@
 #pragma once
 
+#include "simulator/traffic/TrafficLog.h"
+
 #include <chrono>
 #include <cstdint>
 #include <functional>
@@ -29,8 +31,8 @@ public:
 
     explicit LockTable(Timers &timers) : m_timers(timers) {}
 
-    /// A client comes. @p changed is called after each change of the locks.
-    Owner join(std::function<void()> changed);
+    /// A client comes. @p changed is called after each change of the locks; @p traffic, when there is one, is told of this client's.
+    Owner join(std::function<void()> changed, TrafficLog::Client *traffic = nullptr);
     /// It goes: what it holds is free, what it waits for is forgotten.
     void leave(Owner owner);
 
@@ -51,6 +53,7 @@ private:
 
     struct Client {
         std::function<void()> changed;
+        TrafficLog::Client *traffic = nullptr;
         bool shares = false;
     };
     struct Wait {
@@ -60,6 +63,8 @@ private:
         AnswerAction answer;
     };
 
+    void tell(Owner owner, const std::string &key, Answer answer) const;
+    void tellRelease(Owner owner, const std::string &key) const;
     bool grant(Owner owner, const std::string &key);
     void changed();
     void tellChange();

@@ -34,14 +34,18 @@ MessageExchange::~MessageExchange()
 void MessageExchange::receive(std::span<const std::byte> &bytes)
 {
     while (!bytes.empty() && accepting()) {
-        switch (m_input.scan(bytes)) {
+        const std::span<const std::byte> before = bytes;
+        const InputBuffer::Found found = m_input.scan(bytes);
+        if (m_traffic != nullptr)
+            m_traffic->received(before.first(before.size() - bytes.size()));
+        switch (found) {
         case InputBuffer::Found::Nothing:
             break;
         case InputBuffer::Found::Unit:
             runUnit(false);
             break;
         case InputBuffer::Found::Message:
-            return runUnit(true);
+            return runMessage();
         }
     }
 }
@@ -49,7 +53,21 @@ void MessageExchange::receive(std::span<const std::byte> &bytes)
 void MessageExchange::end()
 {
     if (m_input.end() == InputBuffer::Found::Message)
-        runUnit(true);
+        runMessage();
+}
+
+void MessageExchange::directReceived(std::size_t count)
+{
+    if (m_traffic != nullptr)
+        m_traffic->blockReceived(count);
+    m_input.blockFilled(count);
+}
+
+void MessageExchange::runMessage()
+{
+    if (m_traffic != nullptr)
+        m_traffic->messageEnds();
+    runUnit(true);
 }
 
 void MessageExchange::runUnit(bool endsMessage)
@@ -110,8 +128,11 @@ void MessageExchange::finishMessage()
     m_pathSuffixes.clear();
     m_indefiniteSent = false;
     m_deadlocked = false;
-    if (!m_output.empty())
-        m_output.complete();
+    if (m_output.empty())
+        return;
+    m_output.complete();
+    if (m_traffic != nullptr)
+        m_traffic->answered(m_output.segments());
 }
 
 void MessageExchange::report(const ScpiError &error)
@@ -133,6 +154,8 @@ void MessageExchange::unterminated()
     m_response.take();
     m_output.clear();
     finishMessage();
+    if (m_traffic != nullptr)
+        m_traffic->forget();
     m_available = false;
     report({-420, {}});
     m_instrument.publishStatus();
@@ -147,20 +170,34 @@ void MessageExchange::clear()
     forgetOperationComplete();
     m_input.clear();
     m_response.take();
-    finishMessage();
     m_output.clear();
+    finishMessage();
+    if (m_traffic != nullptr)
+        m_traffic->forget();
     m_available = false;
     updateService();
 }
 
 void MessageExchange::trigger()
 {
+    if (m_traffic != nullptr)
+        m_traffic->event("trigger");
     try {
+        if (m_input.inMessage())
+            throw ScpiError{-105, {}};
         m_instrument.trigger();
     } catch (const ScpiError &error) {
         report(error);
     }
     m_instrument.publishStatus();
+}
+
+std::uint8_t MessageExchange::poll()
+{
+    const std::uint8_t byte = m_service.poll(statusByte());
+    if (m_traffic != nullptr)
+        m_traffic->event("serial poll", byte);
+    return byte;
 }
 
 void MessageExchange::setMessageAvailable(bool available)
@@ -185,8 +222,12 @@ std::uint8_t MessageExchange::masterSummaryByte() const
 void MessageExchange::updateService()
 {
     const std::uint8_t byte = statusByte();
-    if (m_service.update(byte, m_instrument.status.serviceEnable()) && m_traits.serviceRequest)
-        m_traits.serviceRequest(static_cast<std::uint8_t>(byte | StbRequestService));
+    if (!m_service.update(byte, m_instrument.status.serviceEnable()) || !m_traits.serviceRequest)
+        return;
+    const auto request = static_cast<std::uint8_t>(byte | StbRequestService);
+    if (m_traffic != nullptr)
+        m_traffic->event("service request", request);
+    m_traits.serviceRequest(request);
 }
 
 void MessageExchange::holdFor(std::chrono::nanoseconds delay, Continuation then)

@@ -4,6 +4,7 @@
 #include "simulator/instrument/InputBuffer.h"
 #include "simulator/instrument/Response.h"
 #include "simulator/instrument/StatusModel.h"
+#include "simulator/traffic/TrafficLog.h"
 
 #include <chrono>
 #include <cstdint>
@@ -66,7 +67,7 @@ public:
     void end();
     /// Where the next bytes can be received directly, then told to directReceived(); empty when not inside a block.
     std::span<std::byte> directInput() { return accepting() ? m_input.blockSpace() : std::span<std::byte>{}; }
-    void directReceived(std::size_t count) { m_input.blockFilled(count); }
+    void directReceived(std::size_t count);
     bool inMessage() const { return m_held || m_input.inMessage(); }
     OutputQueue &output() { return m_output; }
     /// The client sent something new before it had read its answer: -410, and the answer is gone.
@@ -75,10 +76,16 @@ public:
     void unterminated();
     /// Device clear: exchange and pending waits as after power-on; settings, status and errors stay.
     void clear();
+    /// Group execute trigger; inside a program message it is refused.
     void trigger();
     void setMessageAvailable(bool available);
     /// Serial poll.
-    std::uint8_t poll() { return m_service.poll(statusByte()); }
+    std::uint8_t poll();
+    bool requestsService() const { return m_service.requesting(); }
+
+    /// Who is told what passes from now on; null for nobody. Must outlive the exchange or be taken back.
+    void setTraffic(TrafficLog::Client *traffic) { m_traffic = traffic; }
+    TrafficLog::Client *traffic() const { return m_traffic; }
 
     // For commands and the instrument.
     std::uint8_t statusByte() const;
@@ -92,6 +99,7 @@ public:
     void forgetOperationComplete();
 
 private:
+    void runMessage();
     void runUnit(bool endsMessage);
     void resume();
     void finishUnit();
@@ -101,6 +109,7 @@ private:
     Instrument &m_instrument;
     Client &m_client;
     const Traits m_traits;
+    TrafficLog::Client *m_traffic = nullptr;
 
     InputBuffer m_input;
     OutputQueue m_output;

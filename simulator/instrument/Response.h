@@ -56,6 +56,7 @@ public:
     void complete();
     bool isComplete() const { return m_complete; }
     bool empty() const { return m_segments.empty(); }
+    const ResponseSegments &segments() const { return m_segments; }
     ResponseSegments take();
     void clear();
 

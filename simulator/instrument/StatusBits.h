@@ -33,6 +33,7 @@ enum OperationBit : std::uint16_t {
 
 enum QuestionableBit : std::uint16_t {
     QuestionableVoltage = 0x0001, ///< an output does not hold its voltage because its current limit does
+    QuestionableCurrent = 0x0002, ///< a current protection has tripped
 };
 
 } // namespace simulator

@@ -40,6 +40,16 @@ void StatusModel::setServiceEnable(std::uint8_t mask)
     m_sre = static_cast<std::uint8_t>(mask & ~StbRequestService);
 }
 
+void StatusModel::powerOn(bool clear)
+{
+    m_esr = EsrPowerOn;
+    if (!clear)
+        return;
+    m_ese = m_sre = 0;
+    operation.preset();
+    questionable.preset();
+}
+
 void StatusModel::clearEvents()
 {
     m_esr = 0;

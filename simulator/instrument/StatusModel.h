@@ -15,6 +15,7 @@ public:
     std::uint16_t condition() const { return m_condition; }
     /// Reading clears.
     std::uint16_t takeEvent();
+    std::uint16_t event() const { return m_event; }
     void clearEvent() { m_event = 0; }
     void preset();
     bool summary() const { return (m_event & enable) != 0; }
@@ -36,10 +37,13 @@ public:
 
     void setEvent(std::uint8_t bits) { m_esr |= bits; }
     std::uint8_t takeEvent();
+    std::uint8_t event() const { return m_esr; }
     std::uint8_t eventEnable() const { return m_ese; }
     void setEventEnable(std::uint8_t mask) { m_ese = mask; }
     std::uint8_t serviceEnable() const { return m_sre; }
     void setServiceEnable(std::uint8_t mask);
+    /// The power comes: tells so, and clears the enables and filters if @p clear (*PSC).
+    void powerOn(bool clear);
     /// *CLS: all event registers, none of the enables and filters.
     void clearEvents();
 
@@ -66,6 +70,7 @@ public:
     bool update(std::uint8_t statusByte, std::uint8_t serviceEnable);
     /// The status byte with RQS as bit 6, which is 0 afterwards.
     std::uint8_t poll(std::uint8_t statusByte);
+    bool requesting() const { return m_requesting; }
 
 private:
     std::uint8_t m_reasons = 0;

@@ -1,6 +1,6 @@
 #include "simulator/server/Connection.h"
 
-#include "simulator/instrument/Bytes.h"
+#include "simulator/server/FaultySend.h"
 
 #include <netinet/in.h>
 #include <netinet/tcp.h>
@@ -22,6 +22,8 @@ namespace
 constexpr std::size_t BytesPerTurn = 4 * 1024 * 1024;
 constexpr std::size_t MaxDirect = 1024 * 1024;
 constexpr std::size_t MaxPieces = 64;
+// A client that a fault has cut off may look at what it got before its connection goes altogether.
+constexpr std::chrono::seconds PatienceForCut{2};
 
 void setOption(int fd, int level, int option)
 {
@@ -30,17 +32,6 @@ void setOption(int fd, int level, int option)
 }
 
 } // namespace
-
-std::vector<Outgoing> toOutgoing(ResponseSegments segments)
-{
-    std::vector<Outgoing> pieces;
-    pieces.reserve(segments.size());
-    for (ResponseSegment &segment : segments) {
-        const std::span<const std::byte> bytes = segment.block ? segment.block->view() : std::span<const std::byte>{};
-        pieces.push_back({std::move(segment.text), std::move(segment.block), bytes});
-    }
-    return pieces;
-}
 
 Connection::Connection(EventLoop &loop, FileDescriptor socket, Owner &owner)
     : m_loop(loop), m_socket(std::move(socket)), m_owner(&owner), m_events(EPOLLIN),
@@ -53,6 +44,7 @@ Connection::Connection(EventLoop &loop, FileDescriptor socket, Owner &owner)
 
 Connection::~Connection()
 {
+    m_loop.cancel(m_hold);
     m_loop.cancel(m_timer);
     m_loop.remove(m_watch);
 }
@@ -137,13 +129,15 @@ void Connection::read()
     updateWatch();
 }
 
-void Connection::send(std::vector<Outgoing> message)
+void Connection::send(std::vector<Outgoing> message, std::chrono::nanoseconds delay)
 {
+    if (m_cut)
+        return;
     const bool wasEmpty = m_queue.empty();
     bool first = true;
     for (Outgoing &piece : message) {
         m_unsent += piece.size();
-        m_queue.push_back({std::move(piece), std::exchange(first, false)});
+        m_queue.push_back({std::move(piece), std::exchange(first, false), std::exchange(delay, {})});
     }
     if (wasEmpty)
         flush();
@@ -156,10 +150,40 @@ void Connection::send(std::string message)
     send(std::move(pieces));
 }
 
+void Connection::sendPast(Faults &faults, const MessageForm &form, std::vector<Outgoing> message)
+{
+    if (!faults.any())
+        return send(std::move(message));
+    const Delivery delivery = passFaults(faults, form, message);
+    if (delivery.dropped)
+        return;
+    send(std::move(message), delivery.delay);
+    if (!delivery.cut)
+        return;
+    m_cut = true;
+    closeAfterSending(PatienceForCut + std::chrono::ceil<std::chrono::milliseconds>(delivery.delay));
+}
+
+/// True while the first chunk has to wait for its time.
+bool Connection::firstIsHeld()
+{
+    std::chrono::nanoseconds &delay = m_queue.front().delay;
+    if (delay > std::chrono::nanoseconds{0}) {
+        const std::chrono::nanoseconds wait = std::exchange(delay, {});
+        m_hold = m_loop.after(wait, [this] {
+            m_hold = Timers::None;
+            flush();
+            if (m_queue.empty() && !m_closing && !m_failed)
+                m_owner->drained();
+        });
+    }
+    return m_hold != Timers::None;
+}
+
 void Connection::flush()
 {
     std::size_t turn = 0;
-    while (!m_queue.empty() && !m_failed && turn < BytesPerTurn) {
+    while (!m_queue.empty() && !m_failed && turn < BytesPerTurn && !firstIsHeld()) {
         std::array<iovec, MaxPieces> pieces;
         std::size_t count = 0;
         std::size_t skip = m_sentOfFirst;
@@ -170,6 +194,8 @@ void Connection::flush()
                 pieces[count++] = {const_cast<char *>(static_cast<const char *>(data)) + skipped, size - skipped};
         };
         for (auto chunk = m_queue.begin(); chunk != m_queue.end() && count + 2 <= MaxPieces; ++chunk) {
+            if (chunk->delay > std::chrono::nanoseconds{0})
+                break;
             add(chunk->piece.text.data(), chunk->piece.text.size());
             add(chunk->piece.bytes.data(), chunk->piece.bytes.size());
         }
@@ -218,6 +244,8 @@ void Connection::dropUnsent()
         ++chunk;
     for (auto dropped = chunk; dropped != m_queue.end(); ++dropped)
         m_unsent -= dropped->piece.size();
+    if (chunk == m_queue.begin())
+        m_loop.cancel(std::exchange(m_hold, Timers::None));
     m_queue.erase(chunk, m_queue.end());
 }
 
@@ -239,7 +267,7 @@ void Connection::updateWatch()
     const bool room = m_begin > 0 || m_end < BufferSize;
     if (!m_inputEnded && (m_closing || room))
         events |= EPOLLIN;
-    if (!m_queue.empty())
+    if (!m_queue.empty() && m_hold == Timers::None)
         events |= EPOLLOUT;
     if (events != m_events && !m_failed)
         m_loop.change(m_watch, m_events = events);

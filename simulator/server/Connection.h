@@ -1,8 +1,9 @@
 #pragma once
 
-#include "simulator/instrument/Response.h"
+#include "simulator/server/BoundSocket.h"
 #include "simulator/server/EventLoop.h"
 #include "simulator/server/FileDescriptor.h"
+#include "simulator/server/Outgoing.h"
 
 #include <cstddef>
 #include <deque>
@@ -14,16 +15,8 @@
 namespace simulator
 {
 
-/// Bytes to be sent: some text, then perhaps a stretch of a stored block, which is kept alive and not copied.
-struct Outgoing {
-    std::string text;
-    std::shared_ptr<const Bytes> keeper;
-    std::span<const std::byte> bytes; ///< of keeper
-
-    std::size_t size() const { return text.size() + bytes.size(); }
-};
-
-std::vector<Outgoing> toOutgoing(ResponseSegments segments);
+class Faults;
+struct MessageForm;
 
 /**
  * One TCP connection: a receive buffer of fixed size and a queue of what is to be sent. Never blocks.
@@ -71,12 +64,16 @@ public:
     /// Reads what has arrived by now, as if the loop had come by.
     void poll();
 
-    /// Queues a message and sends what the peer takes.
-    void send(std::vector<Outgoing> message);
+    /// Queues a message and sends what the peer takes. Nothing of it leaves before @p delay, nor anything behind it.
+    void send(std::vector<Outgoing> message, std::chrono::nanoseconds delay = {});
     void send(std::string message);
+    /// As send(), in the way that the faults leave to a message of this form.
+    void sendPast(Faults &faults, const MessageForm &form, std::vector<Outgoing> message);
     /// Forgets whole messages of which no byte has been sent.
     void dropUnsent();
     std::size_t unsent() const { return m_unsent; }
+    /// The client's address and port.
+    std::string peer() const { return peerOf(m_socket); }
     /// Closes when everything has been sent, and after @p patience at the latest; input is ignored. closed() follows.
     void closeAfterSending(std::chrono::milliseconds patience);
 
@@ -84,11 +81,13 @@ private:
     struct Chunk {
         Outgoing piece;
         bool beginsMessage;
+        std::chrono::nanoseconds delay; ///< from when it is the first one
     };
 
     void ready(std::uint32_t events);
     void read();
     void flush();
+    bool firstIsHeld();
     void finishSending();
     void updateWatch();
     void fail();
@@ -108,6 +107,8 @@ private:
     std::deque<Chunk> m_queue;
     std::size_t m_sentOfFirst = 0; ///< bytes of the first chunk that are gone
     std::size_t m_unsent = 0;
+    Timers::Id m_hold = Timers::None; ///< the first chunk waits for it
+    bool m_cut = false;               ///< what is said from now on reaches nobody
     bool m_closing = false;
     bool m_failed = false;
     Timers::Id m_timer = Timers::None;

@@ -11,7 +11,7 @@
 namespace simulator
 {
 
-EventLoop::EventLoop() : m_epoll(::epoll_create1(EPOLL_CLOEXEC))
+EventLoop::EventLoop(Now now) : m_now(std::move(now)), m_epoll(::epoll_create1(EPOLL_CLOEXEC))
 {
     if (!m_epoll)
         throw std::system_error(errno, std::generic_category(), "epoll_create1");
@@ -72,7 +72,7 @@ void EventLoop::remove(WatchId watch)
 Timers::Id EventLoop::after(std::chrono::nanoseconds delay, std::function<void()> action)
 {
     const Id id = ++m_lastTimer;
-    const Clock::time_point when = Clock::now() + delay;
+    const Clock::time_point when = m_now() + delay;
     m_due.emplace(when, id);
     m_timers.emplace(id, std::pair{when, std::move(action)});
     return id;
@@ -92,7 +92,7 @@ int EventLoop::timeoutForEpoll() const
     if (m_due.empty())
         return -1;
     // Rounded up: waking a fraction early would spin until the time has come.
-    const auto wait = std::chrono::ceil<std::chrono::milliseconds>(m_due.begin()->first - Clock::now());
+    const auto wait = std::chrono::ceil<std::chrono::milliseconds>(m_due.begin()->first - m_now());
     return static_cast<int>(std::clamp<std::int64_t>(wait.count(), 0, std::numeric_limits<int>::max()));
 }
 
@@ -101,7 +101,7 @@ void EventLoop::runTimers()
     if (m_due.empty())
         return;
     // Only what was asked for before now, so that actions which ask again cannot hold the loop.
-    const Clock::time_point now = Clock::now();
+    const Clock::time_point now = m_now();
     const Id last = m_lastTimer;
     auto next = m_due.begin();
     while (next != m_due.end() && next->first <= now) {

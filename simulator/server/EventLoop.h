@@ -27,7 +27,11 @@ public:
     using WatchId = std::uint64_t;
     using Ready = std::function<void(std::uint32_t events)>; ///< EPOLLIN, EPOLLOUT, ...
 
-    EventLoop();
+    using Clock = std::chrono::steady_clock;
+    using Now = std::function<Clock::time_point()>;
+
+    /// @p now: another clock, for tests.
+    explicit EventLoop(Now now = Clock::now);
 
     /// Runs until stop(), which may be called from any of the calls.
     void run();
@@ -44,8 +48,6 @@ public:
     void destroyLater(std::shared_ptr<void> object) { m_dying.push_back(std::move(object)); }
 
 private:
-    using Clock = std::chrono::steady_clock;
-
     struct Watch {
         int fd;
         Ready ready;
@@ -54,6 +56,7 @@ private:
     int timeoutForEpoll() const;
     void runTimers();
 
+    const Now m_now;
     FileDescriptor m_epoll;
     bool m_running = false;
     WatchId m_lastWatch = 0;

@@ -1,11 +1,51 @@
 #include "simulator/server/HislipChannel.h"
 
+#include "simulator/fault/MessageForm.h"
+
 #include <algorithm>
 
 namespace simulator
 {
 
 using namespace wire::hislip;
+
+namespace
+{
+
+constexpr std::size_t MaxUnreadAnswers = 1024 * 1024;
+
+} // namespace
+
+namespace
+{
+
+MessageForm formOf(const Header &header, FaultProtocol protocol)
+{
+    MessageForm form{protocol};
+    form.header = HeaderSize;
+    form.length = {8, 8};
+    if (header.type != MessageType::Data && header.type != MessageType::DataEnd)
+        return form;
+    form.answer = true;
+    form.id = {4, 4};
+    form.idStep = 2;
+    form.payloadAt = HeaderSize;
+    form.payloadSize = static_cast<std::size_t>(header.payloadLength);
+    if (header.type == MessageType::DataEnd) {
+        form.end = EndMark::Byte;
+        form.endAt = 2;
+        form.openEnd = static_cast<std::uint8_t>(MessageType::Data);
+    }
+    return form;
+}
+
+} // namespace
+
+void HislipChannel::setFaults(Faults &faults, FaultProtocol protocol)
+{
+    m_faults = &faults;
+    m_protocol = protocol;
+}
 
 HislipChannel::Next HislipChannel::next()
 {
@@ -62,15 +102,47 @@ bool HislipChannel::peekNext(Header &header) const
 
 void HislipChannel::send(MessageType type, std::uint8_t control, std::uint32_t parameter, std::string_view payload)
 {
-    const auto header = encode({type, control, parameter, payload.size()});
+    const Header own{type, control, parameter, payload.size()};
+    const auto header = encode(own);
     std::string message{reinterpret_cast<const char *>(header.data()), header.size()};
     message += payload;
-    m_connection->send(std::move(message));
+    if (m_connection->unsent() == 0)
+        m_unreadAnswers = 0;
+    m_unreadAnswers += message.size();
+    std::vector<Outgoing> pieces;
+    pieces.push_back({std::move(message), nullptr, {}});
+    transmit(own, std::move(pieces));
+}
+
+void HislipChannel::sendData(const Header &header, std::vector<Outgoing> payload)
+{
+    const auto bytes = encode(header);
+    payload.front().text.insert(0, reinterpret_cast<const char *>(bytes.data()), bytes.size());
+    transmit(header, std::move(payload));
+}
+
+void HislipChannel::transmit(const Header &header, std::vector<Outgoing> message)
+{
+    if (m_faults)
+        m_connection->sendPast(*m_faults, formOf(header, m_protocol), std::move(message));
+    else
+        m_connection->send(std::move(message));
 }
 
 void HislipChannel::sendError(ErrorCode code, std::string_view text)
 {
     send(MessageType::Error, static_cast<std::uint8_t>(code), 0, text);
+}
+
+void HislipChannel::refuse(ErrorCode code, std::string_view text)
+{
+    sendError(code, text);
+    finish();
+}
+
+bool HislipChannel::isFlooded() const
+{
+    return m_unreadAnswers > MaxUnreadAnswers && m_connection->unsent() > 0;
 }
 
 void HislipChannel::sendFatalError(FatalErrorCode code, std::string_view text)

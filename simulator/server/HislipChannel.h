@@ -1,5 +1,6 @@
 #pragma once
 
+#include "simulator/fault/FaultSpec.h"
 #include "simulator/server/Connection.h"
 #include "wire/Hislip.h"
 
@@ -46,17 +47,31 @@ public:
     /// Header of the message behind the one that is being taken, as far as it has come.
     bool peekNext(wire::hislip::Header &header) const;
 
+    /// Every message from now on goes past the faults first.
+    void setFaults(Faults &faults, FaultProtocol protocol);
+
     void send(wire::hislip::MessageType type, std::uint8_t control = 0, std::uint32_t parameter = 0,
               std::string_view payload = {});
+    /// A piece of a response; @p header tells its length.
+    void sendData(const wire::hislip::Header &header, std::vector<Outgoing> payload);
     void sendError(wire::hislip::ErrorCode code, std::string_view text);
     void sendFatalError(wire::hislip::FatalErrorCode code, std::string_view text);
+    /// Answers an Error to the message that next() shows, and drains that.
+    void refuse(wire::hislip::ErrorCode code, std::string_view text);
+    /// True when the client provokes answers and never reads them. Responses do not count: they wait for the client.
+    bool isFlooded() const;
 
 private:
+    void transmit(const wire::hislip::Header &header, std::vector<Outgoing> message);
+
     std::unique_ptr<Connection> m_connection;
+    Faults *m_faults = nullptr;
+    FaultProtocol m_protocol{};
     wire::hislip::Header m_header;
     std::uint64_t m_remaining = 0;
     bool m_inMessage = false;
     bool m_draining = false;
+    std::size_t m_unreadAnswers = 0; ///< bytes sent since the client had taken all
 };
 
 } // namespace simulator

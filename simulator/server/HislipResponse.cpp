@@ -1,6 +1,7 @@
 #include "simulator/server/HislipResponse.h"
 
 #include "simulator/server/HislipChannel.h"
+#include "simulator/server/HislipDelivery.h"
 
 #include <algorithm>
 
@@ -15,10 +16,10 @@ constexpr std::size_t BytesPerTurn = 8 * 1024 * 1024;
 
 } // namespace
 
-void HislipResponse::begin(ResponseSegments segments, std::uint32_t messageId)
+void HislipResponse::begin(ResponseSegments segments, std::uint32_t request)
 {
     m_left = sizeOf(segments);
-    m_messageId = messageId;
+    m_request = request;
     m_pieces.clear();
     for (Outgoing &piece : toOutgoing(std::move(segments)))
         m_pieces.push_back(std::move(piece));
@@ -30,17 +31,14 @@ void HislipResponse::drop()
     m_left = 0;
 }
 
-void HislipResponse::pump(HislipChannel &channel, std::size_t maxPayload)
+void HislipResponse::pump(HislipChannel &channel, std::size_t maxPayload, HislipDelivery &delivery)
 {
     using namespace wire::hislip;
     std::size_t turn = 0;
     while (m_left > 0 && turn < BytesPerTurn && channel.connection().unsent() < EnoughForNow) {
         const std::size_t size = std::min(m_left, maxPayload);
         const MessageType type = size == m_left ? MessageType::DataEnd : MessageType::Data;
-        const auto header = encode({type, 0, m_messageId, size});
-        std::vector<Outgoing> message = cut(size);
-        message.front().text.insert(0, reinterpret_cast<const char *>(header.data()), header.size());
-        channel.connection().send(std::move(message));
+        channel.sendData({type, 0, delivery.nextId(m_request), size}, cut(size));
         m_left -= size;
         turn += size;
     }

@@ -13,9 +13,8 @@ using namespace wire::hislip;
 namespace
 {
 
-constexpr std::size_t MaxNewcomers = 128;
-constexpr std::chrono::seconds PatienceForIntroduction{10};
-constexpr std::chrono::seconds PatienceForLastWords{2};
+// Sessions that are being told their end, and connections that have said nothing yet, come on top.
+constexpr std::size_t ConnectionsPerSession = 2;
 
 /// The LAN device names that this instrument answers to.
 bool isOurs(std::string_view subAddress)
@@ -33,20 +32,23 @@ bool isOurs(std::string_view subAddress)
 class HislipServer::Newcomer final : public Connection::Owner
 {
 public:
-    Newcomer(HislipServer &server, FileDescriptor socket)
-        : m_server(server), m_channel(std::make_unique<Connection>(server.m_loop, std::move(socket), *this)),
-          m_timer(server.m_loop.after(PatienceForIntroduction, [this] { m_server.forget(*this); }))
+    Newcomer(HislipServer &server, FileDescriptor socket, std::uint64_t order)
+        : number(order), m_server(server),
+          m_channel(std::make_unique<Connection>(server.m_loop, std::move(socket), *this)),
+          m_timer(server.m_loop.after(server.m_options.patience.introduction, [this] { m_server.forget(*this); }))
     {
     }
     ~Newcomer() { m_server.m_loop.cancel(m_timer); }
 
     HislipChannel &channel() { return m_channel; }
 
+    const std::uint64_t number; ///< in the order in which they came
+
     void refuse(FatalErrorCode code, std::string_view text)
     {
         m_refused = true;
         m_channel.sendFatalError(code, text);
-        m_channel.connection().closeAfterSending(PatienceForLastWords);
+        m_channel.connection().closeAfterSending(m_server.m_options.patience.lastWords);
     }
 
 private:
@@ -86,15 +88,16 @@ HislipServer::~HislipServer() = default;
 
 void HislipServer::accept(FileDescriptor socket)
 {
-    if (m_newcomers.size() >= MaxNewcomers)
-        return; // closes it
-    const auto newcomer = std::make_shared<Newcomer>(*this, std::move(socket));
-    m_newcomers.emplace(newcomer.get(), newcomer);
+    // Whoever opens connections and says nothing must not keep others out until patience is at an end.
+    if (m_newcomers.size() >= ConnectionsPerSession * m_options.maxSessions)
+        forget(*m_newcomers.begin()->second);
+    const std::uint64_t number = ++m_lastNewcomer;
+    m_newcomers.emplace(number, std::make_shared<Newcomer>(*this, std::move(socket), number));
 }
 
 void HislipServer::forget(Newcomer &newcomer)
 {
-    const auto found = m_newcomers.find(&newcomer);
+    const auto found = m_newcomers.find(newcomer.number);
     if (found == m_newcomers.end())
         return;
     m_loop.destroyLater(found->second);
@@ -120,20 +123,15 @@ void HislipServer::initialize(Newcomer &newcomer)
     HislipChannel &channel = newcomer.channel();
     if (!isOurs(channel.payload()))
         return newcomer.refuse(FatalErrorCode::BadInitialization, "there is no such sub-address");
-    if (m_sessions.size() >= m_options.maxSessions)
+    if (!makeRoom())
         return newcomer.refuse(FatalErrorCode::MaximumClients, "too many clients");
     channel.taken(static_cast<std::size_t>(channel.remaining()));
     const std::uint16_t id = freeId();
     const auto session = std::make_shared<HislipSession>(m_loop, m_instrument, m_options, id, channel.release(),
-                                                         [this](HislipSession &ended) {
-                                                             const auto found = m_sessions.find(ended.id());
-                                                             if (found == m_sessions.end())
-                                                                 return;
-                                                             m_loop.destroyLater(found->second);
-                                                             m_sessions.erase(found);
-                                                         });
+                                                         [this](HislipSession &ended) { forget(ended); });
     m_sessions.emplace(id, session);
     forget(newcomer);
+    session->start();
 }
 
 void HislipServer::asyncInitialize(Newcomer &newcomer)
@@ -146,6 +144,45 @@ void HislipServer::asyncInitialize(Newcomer &newcomer)
     channel.taken(static_cast<std::size_t>(channel.remaining()));
     found->second->setAsynchronous(channel.release());
     forget(newcomer);
+}
+
+/// Room for a session, at the cost of one that is only being told its end, or of the one that has been waiting longest for its second
+/// connection. False when all have theirs.
+bool HislipServer::makeRoom()
+{
+    std::size_t alive = 0;
+    std::shared_ptr<HislipSession> ended;
+    std::shared_ptr<HislipSession> waiting;
+    const auto age = [this](const auto &session) { return static_cast<std::uint16_t>(m_lastId - session->id()); };
+    const auto takeOlder = [&](std::shared_ptr<HislipSession> &oldest, const std::shared_ptr<HislipSession> &session) {
+        if (!oldest || age(session) > age(oldest))
+            oldest = session;
+    };
+    for (const auto &[id, session] : m_sessions) {
+        alive += session->hasEnded() ? 0 : 1;
+        if (session->hasEnded())
+            takeOlder(ended, session);
+        else if (session->wantsAsynchronous())
+            takeOlder(waiting, session);
+    }
+    if (alive >= m_options.maxSessions) {
+        if (!waiting)
+            return false;
+        waiting->fatal(FatalErrorCode::MaximumClients, "too many clients");
+        forget(*waiting);
+    } else if (ended && m_sessions.size() >= ConnectionsPerSession * m_options.maxSessions) {
+        forget(*ended);
+    }
+    return true;
+}
+
+void HislipServer::forget(const HislipSession &session)
+{
+    const auto found = m_sessions.find(session.id());
+    if (found == m_sessions.end() || found->second.get() != &session)
+        return;
+    m_loop.destroyLater(found->second);
+    m_sessions.erase(found);
 }
 
 std::uint16_t HislipServer::freeId()

@@ -1,9 +1,9 @@
 #pragma once
 
 #include "simulator/instrument/Instrument.h"
-#include "simulator/instrument/MessageExchange.h"
 #include "simulator/server/HislipChannel.h"
-#include "simulator/server/HislipResponse.h"
+#include "simulator/server/HislipControl.h"
+#include "simulator/server/HislipExchange.h"
 
 #include <cstdint>
 #include <functional>
@@ -13,14 +13,26 @@
 namespace simulator
 {
 
+/// How long a client may keep the server waiting.
+struct HislipPatience {
+    std::chrono::seconds introduction{10};     ///< from the connection to the first message
+    std::chrono::seconds secondConnection{30}; ///< from the first connection to the second
+    std::chrono::seconds clear{60};            ///< from the beginning of a device clear to its end
+    std::chrono::seconds lastWords{2};         ///< to take what it is told before the end
+};
+
 struct HislipOptions {
     std::size_t maxSessions = 64;
+    HislipPatience patience = {};
     /// Off for clients that never say that they have read a response (RMT-delivered): an unread one is then no error.
     bool reportUnread = true;
+    /// The mode in which a session begins and that a device clear offers; the client's wish in the clear decides.
+    bool preferOverlapped = false;
 };
 
 /**
- * A HiSLIP client, synchronized mode (IVI-6.1): its two channels, its message exchange, its place in the lock table.
+ * A HiSLIP client (IVI-6.1): its two channels from the first connection to the last, and who deals with what arrives on them. HislipExchange has the program messages and
+ * responses, HislipControl the locks; both exist from the second connection on. Device clear concerns all of it and is done here.
  *
  * The synchronous channel is held while another client's lock shuts this one out or a command makes it wait; what has arrived by then stays where it is. The
  * asynchronous channel is always served. A message there may refer to one on the synchronous channel, which has often arrived already: that
@@ -28,7 +40,7 @@ struct HislipOptions {
  *
  * A session ends when either connection does. It is destroyed when both are closed.
  */
-class HislipSession final : private MessageExchange::Client
+class HislipSession final : private HislipExchange::Owner
 {
 public:
     using Ended = std::function<void(HislipSession &)>;
@@ -40,6 +52,9 @@ public:
     HislipSession &operator=(const HislipSession &) = delete;
 
     std::uint16_t id() const { return m_id; }
+    bool hasEnded() const { return m_ended; }
+    /// Looks at what came behind the introduction.
+    void start() { receiveSync(); }
     /// True until the second connection has come.
     bool wantsAsynchronous() const { return !m_async && !m_ended; }
     void setAsynchronous(std::unique_ptr<Connection> connection);
@@ -52,8 +67,8 @@ private:
         Side(HislipSession &session, void (HislipSession::*receive)()) : m_session(session), m_receive(receive) {}
         void received() override { (m_session.*m_receive)(); }
         std::span<std::byte> directInput() override;
-        void directReceived(std::size_t count) override { m_session.directReceived(count); }
-        void drained() override { m_session.pump(); }
+        void directReceived(std::size_t count) override;
+        void drained() override;
         void closed() override;
 
         HislipSession &m_session;
@@ -61,36 +76,20 @@ private:
         bool m_open = true;
     };
 
-    // Synchronous channel.
+    // HislipExchange::Owner
+    bool mayBegin() const override { return m_control->allowed(); }
+    void completed(std::uint32_t messageId) override { m_control->completed(messageId); }
+    void resume() override { receiveSync(); }
+
     void receiveSync();
     bool syncMessage();
-    bool data();
-    bool trigger();
-    bool mayBegin() const;
-    void beginMessage(const wire::hislip::Header &header);
-    void endMessage();
-    std::span<std::byte> directInput();
-    void directReceived(std::size_t count);
-    void respond();
-    void interrupted(std::uint32_t messageId);
-    void pump();
-    void inputAccepted() override;
-    void deviceClearComplete();
-
-    // Asynchronous channel.
     void receiveAsync();
     void asyncMessage(const wire::hislip::Header &header, std::string_view payload);
-    void maximumMessageSize(std::string_view payload);
     void statusQuery(const wire::hislip::Header &header);
+    void maximumMessageSize(std::string_view payload);
     void deviceClear();
-    void lock(const wire::hislip::Header &header, std::string_view key);
-    void unlock();
-    void remoteLocal(std::uint8_t request);
-    void runDeferred();
-    bool isComplete(std::uint32_t messageId) const;
-    void requestService(std::uint8_t statusByte);
-
-    void refuse(HislipChannel &channel, wire::hislip::ErrorCode code, std::string_view text);
+    void deviceClearComplete();
+    bool isFlooded() const { return m_sync.isFlooded() || (m_async && m_async->isFlooded()); }
     void end();
 
     EventLoop &m_loop;
@@ -103,26 +102,12 @@ private:
     Side m_asyncSide;
     HislipChannel m_sync;
     std::optional<HislipChannel> m_async;
-    std::optional<MessageExchange> m_exchange; ///< from the second connection on
-    LockTable::Owner m_lockOwner = 0;
+    TrafficLog::Client m_traffic;
+    std::optional<HislipControl> m_control;
+    std::optional<HislipExchange> m_exchange;
     bool m_ended = false;
-
-    bool m_inData = false;     ///< the message that the synchronous channel shows has begun
-    bool m_endSeen = false;    ///< and its END has reached the exchange
-    std::uint32_t m_received;  ///< id of the last message that began
-    std::uint32_t m_completed; ///< id of the last one that was dealt with
-    bool m_responseExpected =
-        false; ///< RMT-expected: a complete response was sent, and the client has not said that it has it
-
-    HislipResponse m_response;
-    std::size_t m_clientMessageSize;
-    Timers::Id m_pumpTimer = Timers::None;
-
     bool m_clearing = false; ///< between AsyncDeviceClear and DeviceClearComplete
     Timers::Id m_patience = Timers::None;
-
-    std::optional<std::uint32_t> m_unlockAfter;
-    std::optional<std::pair<std::uint32_t, std::uint8_t>> m_remoteLocalAfter;
 };
 
 } // namespace simulator

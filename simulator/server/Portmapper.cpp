@@ -25,8 +25,9 @@ constexpr int DatagramsPerTurn = 32;
 class Portmapper::Client final : RpcConnection::Client
 {
 public:
-    Client(Portmapper &portmapper, FileDescriptor socket)
-        : m_portmapper(portmapper), m_connection(portmapper.m_loop, std::move(socket), Programs, MaxCall, *this)
+    Client(Portmapper &portmapper, FileDescriptor socket, std::uint64_t number)
+        : m_number(number), m_portmapper(portmapper),
+          m_connection(portmapper.m_loop, std::move(socket), Programs, MaxCall, *this)
     {
     }
 
@@ -42,13 +43,9 @@ private:
             m_connection.refuse(status);
     }
 
-    void closed() override
-    {
-        const auto self = m_portmapper.m_clients.find(this);
-        m_portmapper.m_loop.destroyLater(self->second);
-        m_portmapper.m_clients.erase(self);
-    }
+    void closed() override { m_portmapper.forget(m_number); }
 
+    const std::uint64_t m_number;
     Portmapper &m_portmapper;
     RpcConnection m_connection;
 };
@@ -64,19 +61,37 @@ Portmapper::~Portmapper()
 void Portmapper::accept(FileDescriptor socket)
 {
     if (m_clients.size() >= MaxClients)
-        return; // closes it
-    const auto client = std::make_shared<Client>(*this, std::move(socket));
-    m_clients.emplace(client.get(), client);
+        forget(m_clients.begin()->first);
+    const std::uint64_t number = ++m_lastClient;
+    m_clients.emplace(number, std::make_shared<Client>(*this, std::move(socket), number));
 }
 
-void Portmapper::answerOn(FileDescriptor socket)
+void Portmapper::forget(std::uint64_t client)
+{
+    const auto found = m_clients.find(client);
+    if (found == m_clients.end())
+        return;
+    m_loop.destroyLater(found->second);
+    m_clients.erase(found);
+}
+
+void Portmapper::answerOn(FileDescriptor socket, FileDescriptor broadcasts)
+{
+    const int answerBy = socket.get();
+    listenOn(std::move(socket), answerBy);
+    if (broadcasts)
+        listenOn(std::move(broadcasts), answerBy);
+}
+
+void Portmapper::listenOn(FileDescriptor socket, int answerBy)
 {
     const int fd = socket.get();
-    const EventLoop::WatchId watch = m_loop.watch(fd, EPOLLIN, [this, fd](std::uint32_t) { datagrams(fd); });
+    const EventLoop::WatchId watch =
+        m_loop.watch(fd, EPOLLIN, [this, fd, answerBy](std::uint32_t) { datagrams(fd, answerBy); });
     m_sockets.push_back({std::move(socket), watch});
 }
 
-void Portmapper::datagrams(int socket)
+void Portmapper::datagrams(int socket, int answerBy)
 {
     for (int i = 0; i < DatagramsPerTurn; ++i) {
         std::array<std::byte, MaxCall> buffer;
@@ -92,7 +107,7 @@ void Portmapper::datagrams(int socket)
         const std::vector<std::byte> reply = answer(std::span(buffer).first(static_cast<std::size_t>(size)));
         // An answer that cannot go out now is lost, as any datagram may be.
         if (!reply.empty())
-            ::sendto(socket, reply.data(), reply.size(), MSG_NOSIGNAL, sender, length);
+            ::sendto(answerBy, reply.data(), reply.size(), MSG_NOSIGNAL, sender, length);
     }
 }
 

@@ -28,10 +28,10 @@ public:
 
     void add(const wire::portmap::Mapping &mapping) { m_mappings.push_back(mapping); }
 
-    /// A client over TCP.
+    /// A client over TCP. When there are too many, the one that came first gives way: an answer takes no time.
     void accept(FileDescriptor socket);
-    /// A bound UDP socket on which to answer.
-    void answerOn(FileDescriptor socket);
+    /// A bound UDP socket on which to answer. @param broadcasts a second one to listen on, or none: its answers leave by the first.
+    void answerOn(FileDescriptor socket, FileDescriptor broadcasts);
 
 private:
     class Client;
@@ -40,7 +40,9 @@ private:
         EventLoop::WatchId watch;
     };
 
-    void datagrams(int socket);
+    void forget(std::uint64_t client);
+    void listenOn(FileDescriptor socket, int answerBy);
+    void datagrams(int socket, int answerBy);
     /// The datagram that answers this one; empty when nothing does.
     std::vector<std::byte> answer(std::span<const std::byte> datagram) const;
     /// Writes the results of a procedure. Another status than Success when there are none.
@@ -50,7 +52,8 @@ private:
     EventLoop &m_loop;
     std::vector<wire::portmap::Mapping> m_mappings;
     std::vector<Datagrams> m_sockets;
-    std::map<Client *, std::shared_ptr<Client>> m_clients;
+    std::map<std::uint64_t, std::shared_ptr<Client>> m_clients; ///< by their number, in the order in which they came
+    std::uint64_t m_lastClient = 0;
 };
 
 } // namespace simulator

@@ -15,6 +15,18 @@ namespace
 constexpr std::size_t EnoughUnsent = 1024 * 1024;
 constexpr std::chrono::minutes PatienceForLastReply{1};
 
+/// A record with its mark, its transaction id, and @p header bytes in front of the results.
+MessageForm rpcForm(MessageForm content, std::size_t header)
+{
+    constexpr std::uint64_t LengthOfMark = 0x7FFFFFFF;
+    content.header = header;
+    content.length = {0, 4, LengthOfMark};
+    content.id = {4, 4};
+    content.payloadAt += header;
+    content.endAt += header;
+    return content;
+}
+
 } // namespace
 
 std::optional<rpc::Reply> replyWithoutProgram(rpc::CallForm form, const rpc::Call &call,
@@ -68,25 +80,27 @@ void RpcConnection::takeCall()
     const rpc::CallForm form = rpc::decode(reader, call);
     if (form == rpc::CallForm::NotACall)
         return end();
-    m_busy = true;
+    m_busy = m_hasCalled = true;
     m_xid = call.xid;
     if (const std::optional<rpc::Reply> answer = replyWithoutProgram(form, call, m_programs))
-        reply(*answer, {}, {});
+        reply(*answer, {}, {}, {FaultProtocol::Vxi11});
     else
         m_client.called(call, reader);
 }
 
-void RpcConnection::succeed(std::span<const std::byte> results, std::vector<Outgoing> following)
+void RpcConnection::succeed(std::span<const std::byte> results, std::vector<Outgoing> following,
+                            const MessageForm &content)
 {
-    reply(rpc::success(m_xid), results, std::move(following));
+    reply(rpc::success(m_xid), results, std::move(following), content);
 }
 
 void RpcConnection::refuse(rpc::AcceptStatus status)
 {
-    reply(rpc::refuse(m_xid, status), {}, {});
+    reply(rpc::refuse(m_xid, status), {}, {}, {FaultProtocol::Vxi11});
 }
 
-void RpcConnection::reply(const rpc::Reply &reply, std::span<const std::byte> results, std::vector<Outgoing> following)
+void RpcConnection::reply(const rpc::Reply &reply, std::span<const std::byte> results, std::vector<Outgoing> following,
+                          const MessageForm &content)
 {
     if (m_ended)
         return;
@@ -104,7 +118,10 @@ void RpcConnection::reply(const rpc::Reply &reply, std::span<const std::byte> re
     head.append(reinterpret_cast<const char *>(m_buffer.data()), m_buffer.size());
     head.append(reinterpret_cast<const char *>(results.data()), results.size());
     following.insert(following.begin(), Outgoing{std::move(head), nullptr, {}});
-    m_connection.send(std::move(following));
+    if (m_faults)
+        m_connection.sendPast(*m_faults, rpcForm(content, m_buffer.size()), std::move(following));
+    else
+        m_connection.send(std::move(following));
     m_reader.next();
     m_busy = false;
     received();

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "simulator/fault/MessageForm.h"
 #include "simulator/server/Connection.h"
 #include "wire/Rpc.h"
 #include "wire/RpcRecord.h"
@@ -46,11 +47,20 @@ public:
     RpcConnection(EventLoop &loop, FileDescriptor socket, std::span<const RpcProgram> programs, std::size_t limit,
                   Client &client);
 
-    /// Replies to the call that was handed on. @p following are results that come behind @p results.
-    void succeed(std::span<const std::byte> results, std::vector<Outgoing> following = {});
+    /// Hands on no call any more, nor the end: for a client that gives it up and destroys it later.
+    void stop() { m_ended = true; }
+    /// Every reply from now on goes past the faults first.
+    void setFaults(Faults &faults) { m_faults = &faults; }
+
+    /// Replies to the call that was handed on. @p following are results that come behind @p results. @p content is what they are to the
+    /// faults, its offsets counted from the first of the results.
+    void succeed(std::span<const std::byte> results, std::vector<Outgoing> following = {},
+                 const MessageForm &content = {FaultProtocol::Vxi11});
     void refuse(wire::rpc::AcceptStatus status);
     /// True between called() and the reply.
     bool busy() const { return m_busy; }
+    /// A first call has come.
+    bool hasCalled() const { return m_hasCalled; }
 
 private:
     void received() override;
@@ -58,14 +68,17 @@ private:
     void closed() override { end(); }
 
     void takeCall();
-    void reply(const wire::rpc::Reply &reply, std::span<const std::byte> results, std::vector<Outgoing> following);
+    void reply(const wire::rpc::Reply &reply, std::span<const std::byte> results, std::vector<Outgoing> following,
+               const MessageForm &content);
     void end();
 
     const std::span<const RpcProgram> m_programs;
     Client &m_client;
+    Faults *m_faults = nullptr;
     wire::rpc::RecordReader m_reader;
     std::vector<std::byte> m_buffer; ///< of replies, kept for its memory
     std::uint32_t m_xid = 0;
+    bool m_hasCalled = false;
     bool m_busy = false;
     bool m_receiving = false;
     bool m_ended = false;

@@ -4,6 +4,8 @@
 #include "simulator/instrument/MessageExchange.h"
 #include "simulator/server/Connection.h"
 
+#include <algorithm>
+
 namespace simulator
 {
 namespace
@@ -18,13 +20,18 @@ constexpr std::chrono::hours PatienceForLastAnswer{1};
 class SocketServer::Client final : Connection::Owner, MessageExchange::Client
 {
 public:
-    Client(SocketServer &server, FileDescriptor socket)
-        : m_server(server), m_exchange(server.m_instrument, *this, {false, true, {}}),
+    Client(SocketServer &server, FileDescriptor socket, std::uint64_t number)
+        : m_number(number), m_server(server), m_traffic(server.m_instrument.traffic, "socket", peerOf(socket)),
+          m_exchange(server.m_instrument, *this, {false, true, {}}),
           m_connection(server.m_loop, std::move(socket), *this),
-          m_lockOwner(server.m_instrument.locks.join([this] { received(); }))
+          m_lockOwner(server.m_instrument.locks.join([this] { received(); }, &m_traffic))
     {
+        m_exchange.setTraffic(&m_traffic);
     }
     ~Client() { m_server.m_instrument.locks.leave(m_lockOwner); }
+
+    bool isSilent() const { return m_silent; }
+    std::uint64_t number() const { return m_number; }
 
 private:
     bool mayGoOn() const
@@ -35,6 +42,7 @@ private:
 
     void received() override
     {
+        m_silent = m_silent && m_connection.input().empty();
         answer();
         while (!m_connection.input().empty() && mayGoOn()) {
             m_server.m_instrument.remote.addressed();
@@ -51,8 +59,13 @@ private:
 
     void answer()
     {
-        if (m_exchange.output().isComplete())
-            m_connection.send(toOutgoing(m_exchange.output().take()));
+        if (!m_exchange.output().isComplete())
+            return;
+        std::vector<Outgoing> message = toOutgoing(m_exchange.output().take());
+        MessageForm form{FaultProtocol::Socket, true};
+        form.payloadSize = sizeOf(message) - 1; // without the line feed
+        form.end = EndMark::LastByte;
+        m_connection.sendPast(m_server.m_instrument.faults, form, std::move(message));
     }
 
     std::span<std::byte> directInput() override
@@ -63,31 +76,44 @@ private:
     void drained() override { received(); }
     void inputAccepted() override { received(); }
 
-    void closed() override
-    {
-        const auto self = m_server.m_clients.find(this);
-        if (self == m_server.m_clients.end())
-            return;
-        m_server.m_loop.destroyLater(self->second);
-        m_server.m_clients.erase(self);
-    }
+    void closed() override { m_server.forget(*this); }
 
+    const std::uint64_t m_number;
+    bool m_silent = true; ///< has never said anything
     SocketServer &m_server;
+    TrafficLog::Client m_traffic;
     MessageExchange m_exchange;
     Connection m_connection;
     LockTable::Owner m_lockOwner;
 };
 
-SocketServer::SocketServer(EventLoop &loop, Instrument &instrument) : m_loop(loop), m_instrument(instrument) {}
+SocketServer::SocketServer(EventLoop &loop, Instrument &instrument, std::size_t maxClients)
+    : m_loop(loop), m_instrument(instrument), m_maxClients(maxClients)
+{
+}
 
 SocketServer::~SocketServer() = default;
 
 void SocketServer::accept(FileDescriptor socket)
 {
-    if (m_clients.size() >= MaxClients)
-        return; // closes it
-    const auto client = std::make_shared<Client>(*this, std::move(socket));
-    m_clients.emplace(client.get(), client);
+    if (m_clients.size() >= m_maxClients) {
+        const auto silent =
+            std::find_if(m_clients.begin(), m_clients.end(), [](const auto &each) { return each.second->isSilent(); });
+        if (silent == m_clients.end())
+            return; // closes it
+        forget(*silent->second);
+    }
+    const std::uint64_t number = ++m_lastClient;
+    m_clients.emplace(number, std::make_shared<Client>(*this, std::move(socket), number));
+}
+
+void SocketServer::forget(const Client &client)
+{
+    const auto found = m_clients.find(client.number());
+    if (found == m_clients.end())
+        return;
+    m_loop.destroyLater(found->second);
+    m_clients.erase(found);
 }
 
 } // namespace simulator

@@ -3,6 +3,7 @@
 #include "simulator/server/EventLoop.h"
 #include "simulator/server/FileDescriptor.h"
 
+#include <cstdint>
 #include <map>
 #include <memory>
 
@@ -13,14 +14,13 @@ class Instrument;
 
 /**
  * The raw socket: program messages that end with a line feed, answers that end with one. There is no END, no status byte, no clear; an
- * answer that nobody has read is simply the first one read next.
+ * answer that nobody has read is simply the first one read next. When
+ * there are too many clients, the oldest that has never said anything gives way to a new one.
  */
 class SocketServer
 {
 public:
-    static constexpr std::size_t MaxClients = 64;
-
-    SocketServer(EventLoop &loop, Instrument &instrument);
+    SocketServer(EventLoop &loop, Instrument &instrument, std::size_t maxClients);
     ~SocketServer();
 
     void accept(FileDescriptor socket);
@@ -28,9 +28,13 @@ public:
 private:
     class Client;
 
+    void forget(const Client &client);
+
     EventLoop &m_loop;
     Instrument &m_instrument;
-    std::map<Client *, std::shared_ptr<Client>> m_clients;
+    const std::size_t m_maxClients;
+    std::map<std::uint64_t, std::shared_ptr<Client>> m_clients; ///< by their number, in the order in which they came
+    std::uint64_t m_lastClient = 0;
 };
 
 } // namespace simulator

@@ -18,9 +18,8 @@ Vxi11Device::~Vxi11Device()
 
 void Vxi11Device::write(std::span<const std::byte> bytes, bool end)
 {
-    m_instrument.remote.addressed();
     if (!m_backlog.empty() || !take(bytes, end))
-        keep(bytes, end);
+        keep({{bytes.begin(), bytes.end()}, end});
 }
 
 bool Vxi11Device::takes() const
@@ -45,10 +44,26 @@ bool Vxi11Device::take(std::span<const std::byte> &bytes, bool end)
     return true;
 }
 
-void Vxi11Device::keep(std::span<const std::byte> bytes, bool end)
+/// False when the input, or the rest of it that stays in @p input, has to wait.
+bool Vxi11Device::take(Input &input)
 {
-    m_backlog.push_back({{bytes.begin(), bytes.end()}, end});
-    m_backlogSize += sizeof(Input) + bytes.size();
+    if (input.trigger) {
+        if (!takes())
+            return false;
+        trigger();
+        return true;
+    }
+    std::span<const std::byte> bytes = input.bytes;
+    if (take(bytes, input.end))
+        return true;
+    input.bytes.erase(input.bytes.begin(), input.bytes.end() - static_cast<std::ptrdiff_t>(bytes.size()));
+    return false;
+}
+
+void Vxi11Device::keep(Input input)
+{
+    m_backlogSize += sizeof(Input) + input.bytes.size();
+    m_backlog.push_back(std::move(input));
     takeBacklogLater();
 }
 
@@ -63,14 +78,13 @@ void Vxi11Device::takeBacklog()
 {
     m_backlogTimer = Timers::None;
     while (!m_backlog.empty()) {
-        const Input input = std::move(m_backlog.front());
+        Input input = std::move(m_backlog.front());
         m_backlog.pop_front();
         m_backlogSize -= sizeof(Input) + input.bytes.size();
-        std::span<const std::byte> bytes = input.bytes;
-        if (take(bytes, input.end))
+        if (take(input))
             continue;
-        m_backlog.push_front({{bytes.begin(), bytes.end()}, input.end});
-        m_backlogSize += sizeof(Input) + bytes.size();
+        m_backlogSize += sizeof(Input) + input.bytes.size();
+        m_backlog.push_front(std::move(input));
         break;
     }
     m_events.changed();
@@ -104,7 +118,6 @@ void Vxi11Device::inputAccepted()
 
 void Vxi11Device::readBegins()
 {
-    m_instrument.remote.addressed();
     if (!m_response.active() && m_exchange.accepting() && m_backlog.empty())
         m_exchange.unterminated();
 }
@@ -117,27 +130,27 @@ Vxi11Response::Piece Vxi11Device::read(std::size_t most, std::optional<std::uint
     return piece;
 }
 
+void Vxi11Device::triggerInOrder()
+{
+    if (acceptsTrigger())
+        trigger();
+    else
+        keep({{}, false, true});
+}
+
 void Vxi11Device::trigger()
 {
-    m_instrument.remote.addressed();
     messageBegins();
     m_exchange.trigger();
 }
 
 void Vxi11Device::clear()
 {
-    m_instrument.remote.addressed();
     m_backlog.clear();
     m_backlogSize = 0;
     m_response.drop();
     m_exchange.clear();
     m_events.changed();
-}
-
-std::uint8_t Vxi11Device::poll()
-{
-    m_instrument.remote.addressed();
-    return m_exchange.poll();
 }
 
 } // namespace simulator

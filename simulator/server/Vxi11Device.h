@@ -15,8 +15,8 @@ namespace simulator
 {
 
 /**
- * The instrument as VXI-11.3 shows it under one device name: one message exchange, one output queue and one status byte, however many
- * links there are.
+ * The instrument behind one device name of VXI-11, or at one address of the bus: one message exchange, one output queue and one status byte,
+ * however many links there are.
  *
  * Input that the exchange does not take now, because a command makes it wait, is kept up to InputCapacity: the write that brought it is
  * complete then, and when that is full the next one waits. An answer
@@ -38,6 +38,14 @@ public:
     ~Vxi11Device();
 
     Instrument &instrument() { return m_instrument; }
+    /// What passes from here on is this client's.
+    void setTraffic(TrafficLog::Client &client) { m_exchange.setTraffic(&client); }
+    /// The client goes.
+    void endTraffic(const TrafficLog::Client &client)
+    {
+        if (m_exchange.traffic() == &client)
+            m_exchange.setTraffic(nullptr);
+    }
 
     /// Room for another write.
     bool hasRoom() const { return m_backlogSize < InputCapacity; }
@@ -53,17 +61,22 @@ public:
     bool acceptsTrigger() const { return m_exchange.accepting() && m_backlog.empty(); }
     void trigger();
     void clear();
-    std::uint8_t poll();
+    /// A trigger behind the input that is there already.
+    void triggerInOrder();
+    std::uint8_t poll() { return m_exchange.poll(); }
+    bool requestsService() const { return m_exchange.requestsService(); }
 
 private:
     struct Input {
         std::vector<std::byte> bytes;
         bool end;
+        bool trigger = false; ///< and nothing else
     };
 
     bool takes() const;
     bool take(std::span<const std::byte> &bytes, bool end);
-    void keep(std::span<const std::byte> bytes, bool end);
+    bool take(Input &input);
+    void keep(Input input);
     void takeBacklogLater();
     void takeBacklog();
     void messageBegins();

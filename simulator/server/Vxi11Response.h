@@ -1,6 +1,6 @@
 #pragma once
 
-#include "simulator/server/Connection.h"
+#include "simulator/server/Outgoing.h"
 
 #include <cstdint>
 #include <deque>

@@ -1,7 +1,6 @@
 #include "simulator/server/Vxi11Session.h"
 
 #include <netinet/in.h>
-#include <strings.h>
 #include <sys/socket.h>
 
 #include <algorithm>
@@ -26,6 +25,10 @@ constexpr std::size_t MaxCall = 4 * 1024 * 1024;
 // What a client gets in one reply, however much it asks for.
 constexpr std::size_t MaxReadSize = 1024 * 1024;
 
+// In the results of device_read, where error, reason and the data's length come before the data.
+constexpr std::size_t ReadHeadSize = 12;
+constexpr std::size_t ReasonLastByte = 7;
+
 constexpr std::uint32_t LoopbackNet = 127;
 
 /// The client's IPv4 address; that of an IPv6 client on this machine is the loopback's.
@@ -44,18 +47,13 @@ std::uint32_t peerAddress(int socket)
     return name.any.sa_family == AF_INET6 && IN6_IS_ADDR_LOOPBACK(&name.v6.sin6_addr) ? INADDR_LOOPBACK : 0;
 }
 
-bool isDeviceName(std::string_view name)
-{
-    constexpr std::string_view Only = "inst0";
-    return name.empty() || (name.size() == Only.size() && ::strncasecmp(name.data(), Only.data(), Only.size()) == 0);
-}
-
 } // namespace
 
-Vxi11Session::Vxi11Session(Vxi11Server &server, FileDescriptor socket)
-    : m_server(server), m_peer(peerAddress(socket.get())),
+Vxi11Session::Vxi11Session(Vxi11Server &server, FileDescriptor socket, std::uint64_t number)
+    : m_server(server), m_number(number), m_peer(peerAddress(socket.get())), m_name(peerOf(socket)),
       m_connection(server.loop(), std::move(socket), Programs, MaxCall, *this)
 {
+    m_connection.setFaults(server.faults());
 }
 
 Vxi11Session::~Vxi11Session()
@@ -83,7 +81,7 @@ void Vxi11Session::called(const rpc::Call &call, xdr::Reader arguments)
         constexpr std::array<std::uint32_t, 15> Known{10, 11, 12, 13, 14, 15, 16, 17, 18, 19, 20, 22, 23, 25, 26};
         if (std::find(Known.begin(), Known.end(), call.procedure) == Known.end())
             return m_connection.refuse(rpc::AcceptStatus::ProcedureUnavailable);
-        m_pending = Pending{static_cast<Procedure>(call.procedure), nullptr, 0, 0, 0, {}, {}, false, false};
+        m_pending = Pending{static_cast<Procedure>(call.procedure), nullptr, 0, 0, 0, {}, {}, {}, false, false};
         understood = core(m_pending->procedure, arguments);
     }
     if (!understood) {
@@ -130,9 +128,10 @@ bool Vxi11Session::createLink(xdr::Reader &arguments)
     vxi11::CreateLinkCall call;
     if (!vxi11::decode(arguments, call))
         return false;
-    if (!isDeviceName(call.device))
-        return finish(Error::NotAccessible), true;
-    m_pending->link = m_server.createLink(*this);
+    Vxi11Target *target = nullptr;
+    if (const Error error = m_server.find(call.device, target); error != Error::NoError)
+        return finish(error), true;
+    m_pending->link = m_server.createLink(*this, *target, call.device, m_name);
     if (!m_pending->link)
         return finish(Error::OutOfResources), true;
     if (call.lockDevice)
@@ -214,7 +213,7 @@ bool Vxi11Session::unlock(xdr::Reader &arguments)
     const Vxi11Link *link = ownLink(call.link);
     if (!link)
         finish(Error::InvalidLink);
-    else if (m_server.device().instrument().locks.release(link->lockOwner) == LockTable::Released::Nothing)
+    else if (link->target->locks().release(link->lockOwner) == LockTable::Released::Nothing)
         finish(Error::NoLockHeld);
     else
         finish(Error::NoError);
@@ -240,8 +239,15 @@ bool Vxi11Session::docmd(xdr::Reader &arguments)
     vxi11::DocmdCall call;
     if (!vxi11::decode(arguments, call))
         return false;
-    // Bus commands are for gateways (VXI-11.2); an instrument refuses all of them (VXI-11.3).
-    finish(ownLink(call.link) ? Error::NotSupported : Error::InvalidLink);
+    m_pending->link = ownLink(call.link);
+    m_pending->flags = call.flags;
+    m_pending->lockTimeout = call.lockTimeout;
+    m_pending->ioTimeout = call.ioTimeout;
+    m_pending->command = call;
+    if (!m_pending->link)
+        finish(Error::InvalidLink);
+    else
+        attempt();
     return true;
 }
 
@@ -301,6 +307,11 @@ bool Vxi11Session::abortCall(xdr::Reader &arguments)
 
 // ---- what they have in common
 
+FaultProtocol Vxi11Session::protocol() const
+{
+    return m_server.protocolOf(m_pending && m_pending->link ? m_pending->link->target : nullptr);
+}
+
 Vxi11Link *Vxi11Session::ownLink(vxi11::LinkId id)
 {
     Vxi11Link *link = m_server.findLink(id);
@@ -323,44 +334,51 @@ void Vxi11Session::retry()
 
 void Vxi11Session::attempt()
 {
-    Vxi11Device &device = m_server.device();
+    Vxi11Target &target = *m_pending->link->target;
     if (!m_pending->passedLock) {
-        if (!device.instrument().locks.allows(m_pending->link->lockOwner))
+        if (!target.locks().allows(m_pending->link->lockOwner))
             return waitFor(false, (m_pending->flags & vxi11::FlagWaitLock) != 0 ? m_pending->lockTimeout : 0);
         m_pending->passedLock = true;
         m_server.loop().cancel(std::exchange(m_timer, Timers::None));
         if (m_pending->procedure == Procedure::DeviceRead && m_pending->read.requestSize > 0)
-            device.readBegins();
+            target.beginRead();
     }
+    if (Vxi11Device *device = target.device())
+        device->setTraffic(*m_pending->link->traffic);
     switch (m_pending->procedure) {
     case Procedure::DeviceWrite: {
         const xdr::Bytes data = m_pending->data;
-        if (!data.empty()) {
-            if (!device.hasRoom())
-                return waitFor(false, m_pending->ioTimeout);
-            device.write(data, (m_pending->flags & vxi11::FlagEnd) != 0);
-        }
-        return answer(vxi11::WriteResult{Error::NoError, static_cast<std::uint32_t>(data.size())});
+        const std::optional<Error> error =
+            data.empty() ? Error::NoError : target.write(data, (m_pending->flags & vxi11::FlagEnd) != 0);
+        if (!error)
+            return waitFor(false, m_pending->ioTimeout);
+        return answer(
+            vxi11::WriteResult{*error, static_cast<std::uint32_t>(*error == Error::NoError ? data.size() : 0)});
     }
     case Procedure::DeviceRead:
         return attemptRead();
-    case Procedure::DeviceReadStb:
-        return answer(vxi11::ReadStbResult{Error::NoError, device.poll()});
-    case Procedure::DeviceTrigger:
-        if (!device.acceptsTrigger())
-            return waitFor(false, m_pending->ioTimeout);
-        device.trigger();
-        return finish(Error::NoError);
+    case Procedure::DeviceReadStb: {
+        vxi11::ReadStbResult result = target.poll();
+        if (result.error == Error::NoError)
+            result.statusByte = m_server.faults().told(protocol(), result.statusByte);
+        return answer(result);
+    }
+    case Procedure::DeviceTrigger: {
+        const std::optional<Error> error = target.trigger();
+        return error ? finish(*error) : waitFor(false, m_pending->ioTimeout);
+    }
     case Procedure::DeviceClear:
-        device.clear();
-        return finish(Error::NoError);
+        m_pending->link->traffic->event("device clear");
+        return finish(target.clear());
     case Procedure::DeviceRemote:
-        device.instrument().remote.setRemoteEnable(true);
-        device.instrument().remote.addressed();
-        return finish(Error::NoError);
+        return finish(target.remote());
     case Procedure::DeviceLocal:
-        device.instrument().remote.goToLocal();
-        return finish(Error::NoError);
+        return finish(target.local());
+    case Procedure::DeviceDocmd: {
+        std::vector<std::byte> data;
+        const std::optional<Error> error = target.command(m_pending->command, data);
+        return error ? answer(vxi11::DocmdResult{*error, data}) : waitFor(false, m_pending->ioTimeout);
+    }
     default:
         return;
     }
@@ -368,15 +386,18 @@ void Vxi11Session::attempt()
 
 void Vxi11Session::attemptRead()
 {
-    Vxi11Device &device = m_server.device();
     const vxi11::ReadCall &call = m_pending->read;
     const bool termination = (call.flags & vxi11::FlagTermCharSet) != 0;
     if (call.requestSize == 0)
         return answer(vxi11::ReadHead{Error::NoError, vxi11::ReasonRequestCount, 0});
-    if (!device.answerReady())
+    std::optional<Vxi11Target::Reading> reading =
+        m_pending->link->target->read(std::min<std::size_t>(call.requestSize, MaxReadSize),
+                                      termination ? std::optional{call.termChar} : std::nullopt);
+    if (!reading)
         return waitFor(true, call.ioTimeout);
-    Vxi11Response::Piece piece = device.read(std::min<std::size_t>(call.requestSize, MaxReadSize),
-                                             termination ? std::optional{call.termChar} : std::nullopt);
+    if (reading->error != Error::NoError)
+        return finish(reading->error);
+    Vxi11Response::Piece piece = std::move(reading->piece);
     std::uint32_t reason = 0;
     if (piece.last)
         reason |= vxi11::ReasonEnd;
@@ -386,7 +407,16 @@ void Vxi11Session::attemptRead()
         reason |= vxi11::ReasonRequestCount;
     if (const std::size_t padding = xdr::padding(piece.size); padding > 0)
         piece.bytes.push_back({std::string(padding, '\0'), nullptr, {}});
-    answer(vxi11::ReadHead{Error::NoError, reason, static_cast<std::uint32_t>(piece.size)}, std::move(piece.bytes));
+    MessageForm content{FaultProtocol::Vxi11, true};
+    content.payloadAt = ReadHeadSize;
+    content.payloadSize = piece.size;
+    if (piece.last) {
+        content.end = EndMark::Byte;
+        content.endAt = ReasonLastByte;
+        content.openEnd = static_cast<std::uint8_t>(reason & ~std::uint32_t{vxi11::ReasonEnd});
+    }
+    answer(vxi11::ReadHead{Error::NoError, reason, static_cast<std::uint32_t>(piece.size)}, std::move(piece.bytes),
+           content);
 }
 
 void Vxi11Session::waitFor(bool forAnswer, std::uint32_t milliseconds)
@@ -399,12 +429,14 @@ void Vxi11Session::waitFor(bool forAnswer, std::uint32_t milliseconds)
             m_timer = Timers::None;
             finish(late);
         });
-    m_server.wait(*this, forAnswer);
+    m_server.wait(*this, forAnswer ? m_pending->link->target : nullptr);
 }
 
 void Vxi11Session::requestLock(std::uint32_t milliseconds)
 {
-    m_server.device().instrument().locks.request(
+    if (m_server.faults().refusesLock(protocol()))
+        return finish(Error::LockedByAnother);
+    m_pending->link->target->locks().request(
         m_pending->link->lockOwner, {}, std::chrono::milliseconds{milliseconds}, [this](LockTable::Answer granted) {
             const bool creating = m_pending->procedure == Procedure::CreateLink;
             if (granted != LockTable::Answer::Granted)
@@ -423,14 +455,16 @@ void Vxi11Session::abort(vxi11::LinkId link)
         return;
     m_pending->aborted = true;
     if (m_pending->procedure == Procedure::DeviceLock)
-        m_server.device().instrument().locks.endWait(m_pending->link->lockOwner);
+        m_pending->link->target->locks().endWait(m_pending->link->lockOwner);
     else
         finish(Error::Abort);
 }
 
-void Vxi11Session::requestService(std::span<const std::byte> handle)
+void Vxi11Session::requestService(std::span<const std::byte> handle, FaultProtocol protocol)
 {
-    if (m_interrupt)
+    if (!m_interrupt)
+        return;
+    for (unsigned left = m_server.faults().serviceRequests(protocol); left > 0; --left)
         m_interrupt->requestService(handle);
 }
 
@@ -439,7 +473,7 @@ void Vxi11Session::finish(Error error)
     switch (m_pending->procedure) {
     case Procedure::CreateLink:
         if (m_pending->link)
-            m_server.destroyLink(*m_pending->link);
+            m_server.destroyLink(*std::exchange(m_pending->link, nullptr));
         return answer(vxi11::CreateLinkResult{error, 0, 0, 0});
     case Procedure::DeviceWrite:
         return answer(vxi11::WriteResult{error, 0});
@@ -455,13 +489,14 @@ void Vxi11Session::finish(Error error)
 }
 
 template <typename Result>
-void Vxi11Session::answer(const Result &result, std::vector<Outgoing> following)
+void Vxi11Session::answer(const Result &result, std::vector<Outgoing> following, MessageForm content)
 {
     m_buffer.clear();
     xdr::Writer writer(m_buffer);
     encode(writer, result);
+    content.protocol = protocol();
     endPending();
-    m_connection.succeed(m_buffer, std::move(following));
+    m_connection.succeed(m_buffer, std::move(following), content);
 }
 
 void Vxi11Session::endPending()

@@ -20,16 +20,22 @@ namespace simulator
 class Vxi11Session final : private RpcConnection::Client
 {
 public:
-    Vxi11Session(Vxi11Server &server, FileDescriptor socket);
+    /// @p number: sessions count up.
+    Vxi11Session(Vxi11Server &server, FileDescriptor socket, std::uint64_t number);
     ~Vxi11Session();
     Vxi11Session(const Vxi11Session &) = delete;
     Vxi11Session &operator=(const Vxi11Session &) = delete;
 
+    std::uint64_t number() const { return m_number; }
+    /// No call has come yet.
+    bool isSilent() const { return !m_connection.hasCalled(); }
+    /// Executes nothing any more: the server has forgotten it.
+    void stop() { m_connection.stop(); }
     /// Something has changed that the pending call may have waited for.
     void retry();
     /// Ends the pending call on this link with error 23, if there is one.
     void abort(wire::vxi11::LinkId link);
-    void requestService(std::span<const std::byte> handle);
+    void requestService(std::span<const std::byte> handle, FaultProtocol protocol);
 
 private:
     struct Pending {
@@ -40,6 +46,7 @@ private:
         std::uint32_t ioTimeout = 0;
         wire::xdr::Bytes data; ///< of a write
         wire::vxi11::ReadCall read;
+        wire::vxi11::DocmdCall command;
         bool passedLock = false; ///< from here on no lock matters, and the I/O time-out runs
         bool aborted = false;
     };
@@ -62,6 +69,8 @@ private:
     bool destroyInterrupt();
     bool abortCall(wire::xdr::Reader &arguments);
 
+    /// Of the call that is under way.
+    FaultProtocol protocol() const;
     Vxi11Link *ownLink(wire::vxi11::LinkId id);
     bool mayConnectTo(const wire::vxi11::RemoteFunc &remote) const;
     void attempt();
@@ -72,11 +81,14 @@ private:
     /// Ends the pending call with the kind of result that its procedure has and no other news than the error, or none.
     void finish(wire::vxi11::Error error);
     template <typename Result>
-    void answer(const Result &result, std::vector<Outgoing> following = {});
+    void answer(const Result &result, std::vector<Outgoing> following = {},
+                MessageForm content = {FaultProtocol::Vxi11});
     void endPending();
 
     Vxi11Server &m_server;
+    const std::uint64_t m_number;
     const std::uint32_t m_peer; ///< IPv4 address of the client; 0 when it has another one
+    const std::string m_name;   ///< of the client, for those who watch
     std::optional<Pending> m_pending;
     Timers::Id m_timer = Timers::None;
     std::unique_ptr<Vxi11Interrupt> m_interrupt;

@@ -20,6 +20,8 @@ constexpr unsigned long WorkerEndMs = 4000;
 SessionInstanceTab::SessionInstanceTab(VisaDispatcher *dispatcher, QWidget *parent)
     : QWidget(parent), m_handler(dispatcher), m_worker(&m_handler), m_resourceFrame(&m_handler, this),
       m_logTextDisplay(&m_handler, this), m_tabWidget(this), m_basicTab(&m_handler, &m_tabWidget),
+      m_lockTab(&m_handler, &m_tabWidget), m_attributesTab(&m_handler, &m_tabWidget),
+      m_eventTab(&m_handler, &m_tabWidget), m_gpibTab(&m_handler, &m_tabWidget), m_testTab(&m_handler, &m_tabWidget),
       m_resourceName(ResourceNameId)
 {
     m_thread.setWorker(&m_worker);
@@ -45,8 +47,12 @@ void SessionInstanceTab::setupUi()
 {
     setObjectName(QStringLiteral("sessionTab"));
     m_tabWidget.setObjectName(QStringLiteral("sessionPages"));
-    m_basicTab.setAutoFillBackground(true);
-    m_tabWidget.addTab(&m_basicTab, tr("Basics"));
+    addPage(m_basicTab, tr("Basics"));
+    addPage(m_lockTab, tr("Locking"));
+    addPage(m_attributesTab, tr("Attributes"));
+    addPage(m_eventTab, tr("Events"));
+    addPage(m_gpibTab, tr("Gpib"));
+    addPage(m_testTab, tr("Tests"));
     m_resourceFrame.setFrameShape(QFrame::Panel);
     m_resourceFrame.setFrameShadow(QFrame::Raised);
 
@@ -58,6 +64,12 @@ void SessionInstanceTab::setupUi()
     layout->addLayout(below, 20);
 }
 
+void SessionInstanceTab::addPage(QWidget &page, const QString &label)
+{
+    page.setAutoFillBackground(true);
+    m_tabWidget.addTab(&page, label);
+}
+
 void SessionInstanceTab::setupConnections()
 {
     m_logTextDisplay.setQueue(m_worker.getStringMessageQueue());
@@ -65,6 +77,8 @@ void SessionInstanceTab::setupConnections()
     // The frame registers its line edit once more: every change of the name reaches it twice.
     m_resourceName.addObserver(m_resourceFrame.getLineEdit());
     m_resourceFrame.setResourceName(&m_resourceName);
+    m_testTab.setTestLog(m_worker.getTestLog());
+    connect(m_resourceFrame.getLineEdit(), &QLineEdit::textChanged, &m_testTab, &TestTab::resourceNameChanged);
 
     SessionLog *log = m_worker.getLog();
     const QCheckBox *show = m_resourceFrame.getShowLog();

@@ -1,15 +1,20 @@
 #pragma once
 
 #include "app/File.h"
+#include "app/PageTabs.h"
+#include "instrtests/TestTab.h"
 #include "log/LogTextDisplay.h"
+#include "panels/AttributesTab.h"
 #include "panels/BasicTab.h"
+#include "panels/EventTab.h"
+#include "panels/GpibTab.h"
+#include "panels/LockTab.h"
 #include "panels/ResourceFrame.h"
 #include "panels/ResourceName.h"
 #include "pipeline/VisaFunctionCallHandler.h"
 #include "pipeline/VisaSessionWorker.h"
 #include "pipeline/VisaThread.h"
 
-#include <QTabWidget>
 #include <QWidget>
 
 class LogFile;
@@ -51,14 +56,20 @@ protected:
 
 private:
     void setupUi();
+    void addPage(QWidget &page, const QString &label);
     void setupConnections();
 
     VisaFunctionCallHandler m_handler;
     VisaSessionWorker m_worker;
     ResourceFrame m_resourceFrame;
     LogTextDisplay m_logTextDisplay;
-    QTabWidget m_tabWidget;
+    PageTabs m_tabWidget;
     BasicTab m_basicTab;
+    LockTab m_lockTab;
+    AttributesTab m_attributesTab;
+    EventTab m_eventTab;
+    GpibTab m_gpibTab;
+    TestTab m_testTab;
     ResourceName m_resourceName;
     File m_file;
     VisaThread m_thread;

@@ -1,13 +1,23 @@
 tester_library(tester-panels
   SOURCES
+    panels/AttributeCatalogue.cpp
+    panels/AttributeLabel.cpp
+    panels/AttributeListModel.cpp
+    panels/AttributeListView.cpp
+    panels/AttributesTab.cpp
     panels/BasicTab.cpp
     panels/ComboBoxParamerter.cpp
     panels/EventComboBox.cpp
+    panels/EventTab.cpp
     panels/ExprLineEdit.cpp
     panels/GpibAtnComboBox.cpp
+    panels/GpibCommandEdit.cpp
     panels/GpibRenComboBox.cpp
+    panels/GpibTab.cpp
+    panels/HexEscapes.cpp
     panels/LineEditAttribute.cpp
     panels/LineEditParameter.cpp
+    panels/LockTab.cpp
     panels/MechanismFrame.cpp
     panels/ObserverLineEdit.cpp
     panels/OpenModeParameter.cpp

@@ -121,7 +121,10 @@ void ResourceFrame::visaFunctionCallFinished(_visaFunctionCall &call)
 
 void ResourceFrame::setConnected(bool connected)
 {
-    m_connect->setVisible(!connected);
-    m_disconnect->setVisible(connected);
+    // The one that goes first: both at once would push the window apart.
+    QPushButton *gone = connected ? m_connect : m_disconnect;
+    QPushButton *there = connected ? m_disconnect : m_connect;
+    gone->hide();
+    there->show();
     m_resource->setEnabled(!connected);
 }

@@ -1,41 +1,20 @@
 #include "panels/ScipiLineEdit.h"
 
+#include "panels/HexEscapes.h"
+
 #include <QKeyEvent>
 #include <QLineEdit>
-
-#include <algorithm>
 
 namespace
 {
 constexpr unsigned long long CommandHistoryId = 4;
 
-bool isHexDigit(QChar c)
-{
-    return (c >= QLatin1Char('0') && c <= QLatin1Char('9')) || (c >= QLatin1Char('a') && c <= QLatin1Char('f')) ||
-           (c >= QLatin1Char('A') && c <= QLatin1Char('F'));
-}
-
-/// Replaces every backslash, x and exactly @p digits hexadecimal digits by the character of that code modulo 256. The
-/// search goes on at the character just inserted: it can be the backslash of the next escape.
-void expandHexEscapes(QString &text, int digits)
-{
-    int at = text.indexOf(QLatin1String("\\x"));
-    while (at >= 0) {
-        const QString code = text.mid(at + 2, digits);
-        if (code.size() == digits && std::all_of(code.begin(), code.end(), isHexDigit))
-            text.replace(at, 2 + digits, QLatin1Char(static_cast<char>(code.toUInt(nullptr, 16) & 0xFF)));
-        else
-            at += 1;
-        at = text.indexOf(QLatin1String("\\x"), at);
-    }
-}
-
 /// The passes and their order are what users' commands rely on: three digits before two, and the doubled backslash last,
 /// so that it protects nothing. "\0" disappears; a NUL is written "\x00".
 QString expandEscapes(QString text)
 {
-    expandHexEscapes(text, 3);
-    expandHexEscapes(text, 2);
+    expandHexEscapes(text, 3, HexDigits::AnyCase);
+    expandHexEscapes(text, 2, HexDigits::AnyCase);
     text.replace(QLatin1String("\\n"), QLatin1String("\n"));
     text.replace(QLatin1String("\\r"), QLatin1String("\r"));
     text.replace(QLatin1String("\\t"), QLatin1String("\t"));

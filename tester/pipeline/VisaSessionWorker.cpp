@@ -36,13 +36,19 @@ unsigned int length(const Parameter &parameter)
 
 VisaSessionWorker::VisaSessionWorker(VisaFunctionCallHandler *handler)
     : m_logFile(nullptr), m_log(&m_logFile), m_sessionLog(&m_log, nullptr), m_testLog(&m_log, nullptr),
-      m_session(&m_sessionLog), m_handler(handler), m_callBackLog(CallBackLog::createCallBackLog(&m_sessionLog))
+      m_session(&m_sessionLog), m_testThreads{{&m_testLog, this}, {&m_testLog, this}}, m_handler(handler),
+      m_callBackLog(CallBackLog::createCallBackLog(&m_sessionLog))
 {
+    m_testThreads[0].setid(0);
+    m_testThreads[1].setid(1);
     m_fileLogRuns = pthread_create(&m_fileLogThread, nullptr, ThreadForFileLog, &m_log) == 0;
 }
 
 VisaSessionWorker::~VisaSessionWorker()
 {
+    m_closing.store(true);
+    m_testThreads[0].stop();
+    m_testThreads[1].stop();
     // Stopped here as well as by doWork(), which may never have run. From now on nobody blocks on the file queue, so that
     // a callback that is writing comes to its end.
     m_log.stop();
@@ -61,18 +67,38 @@ void VisaSessionWorker::doWork()
             return;
         }
         result.type = request.type;
+        if (request.type == VisaFunctionCallTyp::StopTest) {
+            // The only result of this kind is that of the test, when it has ended.
+            testThread(request.parameter[0]).stop();
+            continue;
+        }
         execute(request, result);
         m_handler->VisaFunctionCallFinshed(result);
     }
 }
 
+void VisaSessionWorker::testFinished(unsigned int result, unsigned int id)
+{
+    if (m_closing.load() || !m_handler)
+        return;
+    _visaFunctionCall finished;
+    finished.type = VisaFunctionCallTyp::StopTest;
+    finished.parameter[0].uintValue = id;
+    finished.parameter[1].uintValue = result;
+    m_handler->VisaFunctionCallFinshed(finished);
+}
+
 void VisaSessionWorker::openRM()
 {
+    m_testThreads[0].openRM();
+    m_testThreads[1].openRM();
     m_session.openRM();
 }
 
 void VisaSessionWorker::closeRM()
 {
+    m_testThreads[0].closeRM();
+    m_testThreads[1].closeRM();
     m_session.closeRM();
     m_findList = 0; // went with its resource manager
     m_findCount = 0;
@@ -161,6 +187,8 @@ void VisaSessionWorker::dispatch(_visaFunctionCall &request, _visaFunctionCall &
         return;
     case VisaFunctionCallTyp::GpibPassControl:
         return m_session.gpibPassControl(shortNumber(first), shortNumber(second));
+    case VisaFunctionCallTyp::Test:
+        return testThread(third).startTest(first.stringValue.c_str(), reinterpret_cast<TestFunction>(second.uintValue));
     default:
         return; // finished at once
     }

@@ -27,8 +27,9 @@ std::string answers(std::string_view bytes, std::size_t piece, bool hasEnd)
     }
     if (hasEnd)
         client.sendEnd();
-    for (int i = 0; i < MaxWaits && timers.waiting() > 0; ++i)
-        timers.turn(std::chrono::hours(1));
+    // One at a time: a continuous acquisition never ends.
+    for (int i = 0; i < MaxWaits && timers.turnToNext(); ++i)
+        continue;
     std::string result = client.takeAnswers();
 
     // Whatever came before: after a device clear it talks sense, and it has kept to its memory.

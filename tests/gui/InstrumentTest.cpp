@@ -1,81 +1,21 @@
 // The whole stack: the window, libkyvisa.so, a socket, the simulated instrument.
 
-#include "gui/support/WindowTest.h"
+#include "gui/support/InstrumentWindowTest.h"
 
 #include "app/MainWindow.h"
 #include "support/ScriptedPeer.h"
-#include "support/SimulatorProcess.h"
 
 #include <QElapsedTimer>
 
 #include <csignal>
-#include <memory>
 
 namespace
 {
 
-class Instrument : public WindowTest
+class Instrument : public InstrumentWindowTest
 {
 protected:
-    Instrument()
-    {
-        startSimulator();
-        openWindow();
-    }
-
-    void startSimulator()
-    {
-        m_simulator =
-            std::make_unique<test::SimulatorProcess>(std::vector<std::string>{"--hislip", "0", "--socket", "0"});
-    }
-
-    QString resource(const char *service) const { return QString::fromStdString(m_simulator->resource(service)); }
-    pid_t simulator() const { return m_simulator->id(); }
-
-    void connectTo(const QString &name)
-    {
-        enter("resourceName", name);
-        press("resourceConnect");
-        ASSERT_TRUE(eventually([this] { return isVisible("resourceDisconnect"); }))
-            << text("statusLabel").toStdString();
-        // The panel's own follow-up has been answered too.
-        ASSERT_TRUE(eventually([this] { return logHolds("type= VI_ATTR_SEND_END_EN,value= 0x1)"); }));
-    }
-
-    bool logHolds(const QString &piece)
-    {
-        for (int row = 0; row < logRows(); ++row)
-            if (logCell(row, 3).contains(piece))
-                return true;
-        return false;
-    }
-
-    QString view() { return shown("basicReadView", "plainText").toString(); }
-
-    void query(const QString &command, const QString &answer)
-    {
-        enter("basicCommand", command);
-        press("basicQuery");
-        EXPECT_TRUE(eventually([&] { return view() == answer; }))
-            << command.toStdString() << " gave " << view().toStdString();
-    }
-
-    void write(const QString &command)
-    {
-        enter("basicCommand", command);
-        press("basicWrite");
-        EXPECT_TRUE(eventually([this] { return text("statusLabel") == "Status: VI_SUCCESS"; }))
-            << text("statusLabel").toStdString();
-    }
-
-    bool statusByte(const QString &value)
-    {
-        press("basicReadStb");
-        return eventually([&] { return text("basicStatusByte") == value; }, 2000);
-    }
-
-private:
-    std::unique_ptr<test::SimulatorProcess> m_simulator;
+    Instrument() : InstrumentWindowTest({"--hislip", "0", "--socket", "0"}) {}
 };
 
 TEST_F(Instrument, AnswersItsIdentificationOverHislip)

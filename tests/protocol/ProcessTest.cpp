@@ -2,10 +2,15 @@
 #include "support/HislipPeer.h"
 #include "support/VisaSession.h"
 
+#include <atomic>
+#include <csignal>
 #include <dlfcn.h>
 #include <filesystem>
+#include <fstream>
 #include <gtest/gtest.h>
+#include <map>
 #include <sys/wait.h>
+#include <thread>
 #include <unistd.h>
 
 using test::acceptHislip;
@@ -46,6 +51,8 @@ TEST(Process, ForkedChildMayCloseAndOpenAnewAndTheParentNoticesNothing)
 {
     ScriptedPeer peer([](ScriptedPeer &self) {
         HislipConnections first = acceptHislip(self);
+        first.async.expect(hex("48530401 00000000 0000000000000000")); // the parent's lock
+        first.async.send(hex("48530501 00000000 0000000000000000"));
         {
             HislipConnections second = acceptHislip(self); // the child's own
             second.sync.expect(hex("48530700 FFFFFF00 0000000000000005") + "child");
@@ -110,6 +117,27 @@ TEST(Process, StartsNoThreadAndKeepsNoDescriptorForAResourceManager)
     EXPECT_EQ(entries("/proc/self/fd"), descriptors);
 }
 
+TEST(Process, OpensThatFailKeepNothing)
+{
+    std::uint16_t refused = 0;
+    {
+        const ScriptedPeer peer([](ScriptedPeer &) {});
+        refused = peer.port();
+    }
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        for (int i = 0; i < 150; ++i)
+            self.accept().close();
+    });
+    VisaSession session;
+    const std::size_t descriptors = entries("/proc/self/fd");
+    for (int i = 0; i < 150; ++i) {
+        EXPECT_EQ(session.open("TCPIP::127.0.0.1::" + std::to_string(refused) + "::SOCKET"), VI_ERROR_RSRC_NFOUND);
+        EXPECT_EQ(session.open(resource(peer)), VI_ERROR_RSRC_NFOUND);
+    }
+    peer.finish();
+    EXPECT_EQ(entries("/proc/self/fd"), descriptors);
+}
+
 TEST(Process, AQueryNeedsNoThread)
 {
     ScriptedPeer peer([](ScriptedPeer &self) {
@@ -124,6 +152,57 @@ TEST(Process, AQueryNeedsNoThread)
     EXPECT_EQ(session.write("?\n"), VI_SUCCESS);
     EXPECT_EQ(session.read(), VI_SUCCESS);
     EXPECT_EQ(entries("/proc/self/task"), threads);
+    viClose(session.vi);
+}
+
+/// The signals that each thread of this process blocks, by thread.
+std::map<std::string, unsigned long long> blockedSignals()
+{
+    std::map<std::string, unsigned long long> blocked;
+    for (const auto &task : std::filesystem::directory_iterator("/proc/self/task")) {
+        std::ifstream status(task.path() / "status");
+        for (std::string line; std::getline(status, line);)
+            if (line.starts_with("SigBlk:"))
+                blocked[task.path().filename().string()] = std::stoull(line.substr(7), nullptr, 16);
+    }
+    return blocked;
+}
+
+ViStatus noteEvent(ViSession, ViEventType, ViEvent, ViAddr called)
+{
+    *static_cast<std::atomic<bool> *>(called) = true;
+    return VI_SUCCESS;
+}
+
+TEST(Process, ThreadsOfTheLibraryTakeNoSignals)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        HislipConnections client = acceptHislip(self);
+        client.async.send(hex("48531442 00000000 0000000000000000"));
+        client.sync.expectClosed();
+    });
+    VisaSession session;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    sigset_t none; // whatever this program was started with
+    sigset_t inherited;
+    ::sigemptyset(&none);
+    ASSERT_EQ(::pthread_sigmask(SIG_SETMASK, &none, &inherited), 0);
+    const auto before = blockedSignals();
+    std::atomic<bool> called{false};
+    ASSERT_EQ(viInstallHandler(session.vi, VI_EVENT_SERVICE_REQ, noteEvent, &called), VI_SUCCESS);
+    ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_HNDLR, 0), VI_SUCCESS);
+    while (!called) // both threads run by then: one that is just starting blocks signals in any case
+        std::this_thread::yield();
+    int ofTheLibrary = 0;
+    for (const auto &[thread, blocked] : blockedSignals()) {
+        if (before.contains(thread))
+            continue;
+        ++ofTheLibrary;
+        for (const int signal : {SIGHUP, SIGINT, SIGTERM, SIGUSR1, SIGALRM, SIGCHLD, SIGIO, SIGRTMIN + 5})
+            EXPECT_NE(blocked & 1ull << (signal - 1), 0u) << "signal " << signal;
+    }
+    EXPECT_EQ(ofTheLibrary, 2); // one reads, one calls handlers
+    EXPECT_EQ(::pthread_sigmask(SIG_SETMASK, &inherited, nullptr), 0);
     viClose(session.vi);
 }
 

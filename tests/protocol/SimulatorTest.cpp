@@ -3,7 +3,11 @@
 #include "support/VisaSession.h"
 
 #include <algorithm>
+#include <atomic>
+#include <chrono>
 #include <csignal>
+#include <cstdlib>
+#include <filesystem>
 #include <gtest/gtest.h>
 #include <thread>
 
@@ -18,6 +22,11 @@ struct Service {
     std::vector<std::string> options;
 };
 
+void usePortmapperOf(const SimulatorProcess &simulator)
+{
+    ::setenv("KYVISA_PORTMAPPER_PORT", simulator.resource("portmapper").c_str(), 1);
+}
+
 class Simulator : public testing::TestWithParam<Service>
 {
 protected:
@@ -25,6 +34,7 @@ protected:
 
     void prepare(VisaSession &session)
     {
+        usePortmapperOf(m_simulator);
         ASSERT_EQ(session.open(m_simulator.resource(GetParam().name)), VI_SUCCESS);
         session.set(VI_ATTR_TMO_VALUE, 20000);
         session.set(VI_ATTR_TERMCHAR_EN, isSocket() ? VI_TRUE : VI_FALSE);
@@ -42,9 +52,24 @@ protected:
     VisaSession m_session;
 };
 
+std::string nameOf(const testing::TestParamInfo<Service> &service)
+{
+    return service.param.name;
+}
+
 INSTANTIATE_TEST_SUITE_P(All, Simulator,
+                         testing::Values(Service{"hislip", {"--hislip", "0"}}, Service{"socket", {"--socket", "0"}},
+                                         Service{"vxi11", {"--vxi11", "0", "--portmapper", "0"}}),
+                         nameOf);
+
+/// Each client has an output queue of its own. All VXI-11 links to one instrument share one.
+class SimulatorQueues : public Simulator
+{
+};
+
+INSTANTIATE_TEST_SUITE_P(All, SimulatorQueues,
                          testing::Values(Service{"hislip", {"--hislip", "0"}}, Service{"socket", {"--socket", "0"}}),
-                         [](const auto &service) { return std::string(service.param.name); });
+                         nameOf);
 
 TEST_P(Simulator, IdentifiesItself)
 {
@@ -84,7 +109,7 @@ TEST_P(Simulator, TimesOutWhenNothingWasAsked)
     EXPECT_EQ(query(m_session, "*OPC?"), "1\n");
 }
 
-TEST_P(Simulator, ServesTwoThreadsOnTwoSessions)
+TEST_P(SimulatorQueues, ServesTwoThreadsOnTwoSessions)
 {
     VisaSession other;
     prepare(other);
@@ -141,6 +166,7 @@ TEST_P(Simulator, EndOfTheSimulatorIsALostConnection)
     {
         SimulatorProcess shortLived(GetParam().options);
         VisaSession session;
+        usePortmapperOf(shortLived);
         ASSERT_EQ(session.open(shortLived.resource(GetParam().name)), VI_SUCCESS);
         ::kill(shortLived.id(), SIGTERM);
         session.set(VI_ATTR_TMO_VALUE, 20000);
@@ -214,6 +240,118 @@ TEST_F(SimulatorHislip, RefusesAnUnknownSubAddressPromptly)
     name.replace(name.find("hislip0"), 7, "hislip7");
     VisaSession other;
     EXPECT_EQ(other.open(name, 30000), VI_ERROR_RSRC_NFOUND);
+}
+
+class SimulatorVxi11 : public testing::Test
+{
+protected:
+    SimulatorVxi11() { usePortmapperOf(m_simulator); }
+    static std::size_t openDescriptors()
+    {
+        const std::filesystem::directory_iterator entries("/proc/self/fd");
+        return static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
+    }
+
+    SimulatorProcess m_simulator{{"--vxi11", "0", "--portmapper", "0"}};
+    const std::string m_name = m_simulator.resource("vxi11");
+};
+
+// 5. After a couple of hundred open and close cycles nothing opened any more. The simulator has room for 64 clients.
+TEST_F(SimulatorVxi11, TwoThousandSessionsLeaveNeitherLinksNorDescriptorsBehind)
+{
+    VisaSession session;
+    ASSERT_EQ(session.open(m_name), VI_SUCCESS);
+    ASSERT_EQ(viClose(session.vi), VI_SUCCESS);
+    const std::size_t before = openDescriptors();
+    for (int i = 0; i < 2000; ++i) {
+        ASSERT_EQ(session.open(m_name, 20000), VI_SUCCESS) << i;
+        if (i % 10 == 0) {
+            ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_QUEUE, VI_NULL), VI_SUCCESS) << i;
+        }
+        if (i % 10 == 1) {
+            session.set(VI_ATTR_TMO_VALUE, 1);
+            ASSERT_EQ(session.read(), VI_ERROR_TMO) << i;
+        }
+        ASSERT_EQ(viClose(session.vi), VI_SUCCESS) << i;
+        if (i % 10 == 2) {
+            ASSERT_EQ(session.open("TCPIP::127.0.0.1::inst7::INSTR", 20000), VI_ERROR_RSRC_NFOUND) << i;
+        }
+    }
+    EXPECT_EQ(openDescriptors(), before);
+}
+
+TEST_F(SimulatorVxi11, AsksForServiceWhenAnOperationIsComplete)
+{
+    VisaSession session;
+    ASSERT_EQ(session.open(m_name), VI_SUCCESS);
+    session.set(VI_ATTR_TMO_VALUE, 20000);
+    ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_QUEUE, VI_NULL), VI_SUCCESS);
+    ASSERT_EQ(session.write("*CLS;*ESE 1;*SRE 32\n"), VI_SUCCESS);
+    for (int round = 0; round < 10; ++round) {
+        ASSERT_EQ(session.write("*OPC\n"), VI_SUCCESS);
+        ASSERT_EQ(viWaitOnEvent(session.vi, VI_EVENT_SERVICE_REQ, 20000, nullptr, nullptr), VI_SUCCESS);
+        ViUInt16 status = 0;
+        EXPECT_EQ(viReadSTB(session.vi, &status), VI_SUCCESS);
+        EXPECT_EQ(status & 0x60, 0x60);
+        ASSERT_EQ(session.write("*ESR?\n"), VI_SUCCESS);
+        EXPECT_EQ(session.read(), VI_SUCCESS);
+        EXPECT_EQ(session.text, "1\n");
+    }
+}
+
+TEST_F(SimulatorVxi11, TerminateEndsAReadAndTheNextQueryIsAnswered)
+{
+    VisaSession session;
+    ASSERT_EQ(session.open(m_name), VI_SUCCESS);
+    session.set(VI_ATTR_TMO_VALUE, VI_TMO_INFINITE);
+    for (int round = 0; round < 5; ++round) {
+        std::atomic<bool> ended{false};
+        std::thread other([&] {
+            while (!ended) {
+                viTerminate(session.vi, VI_NULL, VI_NULL);
+                std::this_thread::sleep_for(std::chrono::milliseconds(5));
+            }
+        });
+        EXPECT_EQ(session.read(), VI_ERROR_ABORT);
+        ended = true;
+        other.join();
+        session.set(VI_ATTR_TMO_VALUE, 20000);
+        ASSERT_EQ(session.write("*OPC?\n"), VI_SUCCESS);
+        EXPECT_EQ(session.read(), VI_SUCCESS);
+        EXPECT_EQ(session.text, "1\n");
+        session.set(VI_ATTR_TMO_VALUE, VI_TMO_INFINITE);
+    }
+}
+
+TEST_F(SimulatorVxi11, AnExclusiveLockShutsOutOthersInTheInstrument)
+{
+    VisaSession holder;
+    ASSERT_EQ(holder.open(m_name), VI_SUCCESS);
+    ASSERT_EQ(viLock(holder.vi, VI_EXCLUSIVE_LOCK, 20000, VI_NULL, VI_NULL), VI_SUCCESS);
+    VisaSession other;
+    // By another name it is another resource to this machine, and the same one to the instrument.
+    ASSERT_EQ(other.open("TCPIP::localhost::inst0::INSTR"), VI_SUCCESS);
+    EXPECT_EQ(other.write("*CLS\n"), VI_ERROR_RSRC_LOCKED);
+    EXPECT_EQ(viLock(other.vi, VI_EXCLUSIVE_LOCK, VI_TMO_IMMEDIATE, VI_NULL, VI_NULL), VI_ERROR_RSRC_LOCKED);
+    EXPECT_EQ(viLock(other.vi, VI_EXCLUSIVE_LOCK, 50, VI_NULL, VI_NULL), VI_ERROR_TMO);
+    std::thread release([&] {
+        std::this_thread::sleep_for(std::chrono::milliseconds(100));
+        EXPECT_EQ(viUnlock(holder.vi), VI_SUCCESS);
+    });
+    EXPECT_EQ(viLock(other.vi, VI_EXCLUSIVE_LOCK, 20000, VI_NULL, VI_NULL), VI_SUCCESS);
+    release.join();
+    EXPECT_EQ(other.write("*CLS\n"), VI_SUCCESS);
+    EXPECT_EQ(holder.write("*CLS\n"), VI_ERROR_RSRC_LOCKED);
+    EXPECT_EQ(viClose(other.vi), VI_SUCCESS) << "which gives the lock back";
+    EXPECT_EQ(holder.write("*CLS\n"), VI_SUCCESS);
+}
+
+TEST_F(SimulatorVxi11, ANameWithoutDeviceFindsIt)
+{
+    VisaSession session;
+    ASSERT_EQ(session.open("TCPIP::localhost::INSTR"), VI_SUCCESS);
+    EXPECT_EQ(session.getText(VI_ATTR_RSRC_NAME), "TCPIP0::localhost::inst0::INSTR");
+    EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_IS_HISLIP), VI_FALSE);
 }
 
 } // namespace

@@ -1,5 +1,6 @@
 #include "support/ScriptedPeer.h"
 
+#include <arpa/inet.h>
 #include <array>
 #include <gtest/gtest.h>
 #include <netinet/in.h>
@@ -56,7 +57,7 @@ void PeerConnection::reset()
     close();
 }
 
-std::string PeerConnection::take(std::size_t count)
+std::string PeerConnection::takeUntilClosed(std::size_t count)
 {
     std::string bytes;
     while (bytes.size() < count) {
@@ -66,12 +67,18 @@ std::string PeerConnection::take(std::size_t count)
             break;
         }
         const ssize_t got = ::recv(m_descriptor, chunk.data(), std::min(chunk.size(), count - bytes.size()), 0);
-        if (got <= 0) {
-            ADD_FAILURE() << "the client closed after " << shown(bytes);
+        if (got <= 0)
             break;
-        }
         bytes.append(chunk.data(), static_cast<std::size_t>(got));
     }
+    return bytes;
+}
+
+std::string PeerConnection::take(std::size_t count)
+{
+    std::string bytes = takeUntilClosed(count);
+    if (bytes.size() < count)
+        ADD_FAILURE() << "the client said no more than " << shown(bytes);
     return bytes;
 }
 
@@ -119,13 +126,32 @@ ScriptedPeer::ScriptedPeer(Script script, bool ipv6)
     sockaddr_in four{};
     four.sin_family = AF_INET;
     four.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    auto *address = ipv6 ? reinterpret_cast<sockaddr *>(&six) : reinterpret_cast<sockaddr *>(&four);
-    socklen_t length = ipv6 ? sizeof six : sizeof four;
+    listen(ipv6 ? reinterpret_cast<sockaddr *>(&six) : reinterpret_cast<sockaddr *>(&four),
+           ipv6 ? sizeof six : sizeof four);
+    m_port = ntohs(ipv6 ? six.sin6_port : four.sin_port);
+    m_thread = std::thread([this, run = std::move(script)] { run(*this); });
+}
+
+ScriptedPeer::ScriptedPeer(Script script, const char *address, std::uint16_t port)
+    : m_listener(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0))
+{
+    const int on = 1;
+    ::setsockopt(m_listener, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    sockaddr_in name{};
+    name.sin_family = AF_INET;
+    name.sin_port = htons(port);
+    ::inet_pton(AF_INET, address, &name.sin_addr);
+    listen(reinterpret_cast<sockaddr *>(&name), sizeof name);
+    m_port = ntohs(name.sin_port);
+    m_thread = std::thread([this, run = std::move(script)] { run(*this); });
+}
+
+/// Stores in @p address what the system chose.
+void ScriptedPeer::listen(sockaddr *address, socklen_t length)
+{
     if (m_listener < 0 || ::bind(m_listener, address, length) != 0 || ::listen(m_listener, 64) != 0 ||
         ::getsockname(m_listener, address, &length) != 0)
         throw std::runtime_error("no listening socket for the scripted peer");
-    m_port = ntohs(ipv6 ? six.sin6_port : four.sin_port);
-    m_thread = std::thread([this, run = std::move(script)] { run(*this); });
 }
 
 ScriptedPeer::~ScriptedPeer()

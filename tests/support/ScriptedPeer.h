@@ -5,6 +5,7 @@
 #include <functional>
 #include <string>
 #include <string_view>
+#include <sys/socket.h>
 #include <thread>
 
 namespace test
@@ -23,6 +24,8 @@ public:
     void expect(std::string_view bytes);
     /// Takes this many bytes, whatever they are.
     std::string take(std::size_t count);
+    /// As take(), but the client may close before: fewer bytes then, and no failure.
+    std::string takeUntilClosed(std::size_t count);
     void send(std::string_view bytes);
     /// Sends until the client has gone or does not read any more; never fails.
     bool trySend(std::string_view bytes);
@@ -48,6 +51,8 @@ public:
     using Script = std::function<void(ScriptedPeer &)>;
 
     explicit ScriptedPeer(Script script, bool ipv6 = false);
+    /// On this IPv4 address and port.
+    ScriptedPeer(Script script, const char *address, std::uint16_t port);
     /// Waits until the script has run to its end.
     ~ScriptedPeer();
     ScriptedPeer(const ScriptedPeer &) = delete;
@@ -58,6 +63,8 @@ public:
     void finish();
 
 private:
+    void listen(sockaddr *address, socklen_t length);
+
     int m_listener;
     std::uint16_t m_port = 0;
     std::thread m_thread;

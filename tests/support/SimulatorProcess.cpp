@@ -9,6 +9,7 @@
 #include <stdexcept>
 #include <sys/wait.h>
 #include <unistd.h>
+#include <utility>
 
 extern char **environ;
 
@@ -39,9 +40,9 @@ SimulatorProcess::SimulatorProcess(const std::vector<std::string> &options)
     const int error = ::posix_spawn(&m_process, arguments[0], &actions, nullptr, arguments.data(), environ);
     ::posix_spawn_file_actions_destroy(&actions);
     ::close(output[1]);
+    m_output = output[0];
     if (error == 0)
-        readServices(output[0]);
-    ::close(output[0]);
+        readServices();
     if (error != 0)
         throw std::runtime_error("the simulator does not start: " + words[0]);
 }
@@ -50,6 +51,7 @@ SimulatorProcess::~SimulatorProcess()
 {
     if (m_process > 0)
         stop(SIGTERM);
+    closeOutput();
 }
 
 int SimulatorProcess::stop(int signal)
@@ -61,21 +63,44 @@ int SimulatorProcess::stop(int signal)
     return WIFEXITED(status) ? WEXITSTATUS(status) : 256 + WTERMSIG(status);
 }
 
-void SimulatorProcess::readServices(int output)
+void SimulatorProcess::closeOutput()
 {
-    std::string text;
-    while (text.find("ready\n") == text.npos) {
-        pollfd watched{output, POLLIN, 0};
-        std::array<char, 1024> piece;
-        const ssize_t got = ::poll(&watched, 1, Patience) == 1 ? ::read(output, piece.data(), piece.size()) : -1;
-        if (got <= 0) {
+    if (m_output >= 0)
+        ::close(std::exchange(m_output, -1));
+}
+
+bool SimulatorProcess::readMore()
+{
+    pollfd watched{m_output, POLLIN, 0};
+    std::array<char, 1024> piece;
+    const ssize_t got = ::poll(&watched, 1, Patience) == 1 ? ::read(m_output, piece.data(), piece.size()) : -1;
+    m_text.append(piece.data(), static_cast<std::size_t>(got > 0 ? got : 0));
+    return got > 0;
+}
+
+std::string SimulatorProcess::nextLine()
+{
+    while (m_text.find('\n') == m_text.npos)
+        if (!readMore())
+            return {};
+    const std::string line = m_text.substr(0, m_text.find('\n'));
+    m_text.erase(0, line.size() + 1);
+    return line;
+}
+
+void SimulatorProcess::readServices()
+{
+    constexpr std::string_view Ready = "ready\n";
+    while (m_text.find(Ready) == m_text.npos)
+        if (!readMore()) {
             ::kill(m_process, SIGKILL);
             ::waitpid(m_process, nullptr, 0);
-            throw std::runtime_error("the simulator never got ready, it said: " + text);
+            closeOutput();
+            throw std::runtime_error("the simulator never got ready, it said: " + m_text);
         }
-        text.append(piece.data(), static_cast<std::size_t>(got));
-    }
-    std::istringstream lines(text);
+    const std::size_t end = m_text.find(Ready) + Ready.size();
+    std::istringstream lines(m_text.substr(0, end));
+    m_text.erase(0, end);
     for (std::string line; std::getline(lines, line);) {
         const std::size_t first = line.find(' ');
         const std::size_t last = line.rfind(' ');
@@ -93,6 +118,8 @@ std::string SimulatorProcess::resource(const std::string &service) const
 std::uint16_t SimulatorProcess::port(const std::string &service) const
 {
     const std::string name = resource(service);
+    if (name.starts_with("http://"))
+        return static_cast<std::uint16_t>(std::stoi(name.substr(name.rfind(':') + 1)));
     const std::size_t end = name.rfind("::");
     const std::size_t begin = end == name.npos ? name.npos : name.find_last_of(":,", end - 1);
     return begin == name.npos ? 0 : static_cast<std::uint16_t>(std::stoi(name.substr(begin + 1, end - begin - 1)));

@@ -26,11 +26,18 @@ public:
     /// Sends the signal and waits. The exit status; 256 and the signal's number when one ended it.
     int stop(int signal);
     pid_t id() const { return m_process; }
+    /// Waits for the next line that it prints after "ready"; empty when none comes.
+    std::string nextLine();
+    /// Whoever reads its output goes.
+    void closeOutput();
 
 private:
-    void readServices(int output);
+    void readServices();
+    bool readMore();
 
     pid_t m_process = -1;
+    int m_output = -1;
+    std::string m_text; ///< read and not used yet
     std::map<std::string, std::string> m_resources;
 };
 

@@ -2,10 +2,13 @@
 
 #include "app/MainWindow.h"
 
+#include <QAbstractItemView>
 #include <QApplication>
+#include <QComboBox>
 #include <QElapsedTimer>
 #include <QFile>
 #include <QLineEdit>
+#include <QTabBar>
 #include <QTableWidget>
 #include <QTest>
 
@@ -91,6 +94,9 @@ void WindowTest::enter(const char *name, const QString &text)
     auto *line = qobject_cast<QLineEdit *>(field);
     if (!line)
         line = field->findChild<QLineEdit *>();
+    // acts as the system: a click brings a window to the front, also when a list or a dialog took the keyboard with it
+    if (!QApplication::activeWindow() || !QApplication::activeWindow()->isVisible())
+        QApplication::setActiveWindow(field->window());
     QTest::mouseClick(line ? line : field, Qt::LeftButton);
     key(Qt::Key_A, Qt::ControlModifier);
     if (text.isEmpty())
@@ -116,6 +122,65 @@ void WindowTest::enterNumber(const char *name, int number)
 {
     enter(name, QString::number(number));
     key(Qt::Key_Tab);
+}
+
+void WindowTest::showPage(const QString &label)
+{
+    auto *bar = widget("sessionPages")->findChild<QTabBar *>();
+    for (int tab = 0; tab < bar->count(); ++tab) {
+        if (bar->tabText(tab) == label) {
+            QTest::mouseClick(bar, Qt::LeftButton, {}, bar->tabRect(tab).center());
+            return;
+        }
+    }
+    ADD_FAILURE() << "there is no page " << label.toStdString();
+}
+
+void WindowTest::choose(const char *name, const QString &item)
+{
+    auto *box = qobject_cast<QComboBox *>(widget(name));
+    ASSERT_NE(box, nullptr) << name;
+    const int row = box->findText(item, Qt::MatchExactly | Qt::MatchCaseSensitive);
+    ASSERT_GE(row, 0) << name << " does not offer " << item.toStdString();
+    press(name);
+    ASSERT_TRUE(eventually([box] { return box->view()->isVisible(); }));
+    QTest::keyClick(box->view(), Qt::Key_Home);
+    for (int i = 0; i < row; ++i)
+        QTest::keyClick(box->view(), Qt::Key_Down);
+    QTest::keyClick(box->view(), Qt::Key_Return);
+    ASSERT_TRUE(eventually([box] { return !box->view()->isVisible(); }));
+    ASSERT_EQ(box->currentText(), item);
+}
+
+QModelIndex WindowTest::rowIndex(const char *list, const QString &text) const
+{
+    const auto *model = qobject_cast<QAbstractItemView *>(widget(list))->model();
+    for (int row = 0; row < model->rowCount(); ++row)
+        if (model->index(row, 0).data().toString() == text)
+            return model->index(row, 0);
+    return {};
+}
+
+void WindowTest::chooseRow(const char *list, const QString &text)
+{
+    auto *view = qobject_cast<QAbstractItemView *>(widget(list));
+    const QPoint place = view->visualRect(rowIndex(list, text)).center();
+    ASSERT_TRUE(view->indexAt(place).data().toString() == text) << text.toStdString() << " is not to be seen";
+    QTest::mouseClick(view->viewport(), Qt::LeftButton, {}, place);
+}
+
+QVariant WindowTest::rowData(const char *list, const QString &text, int role) const
+{
+    return rowIndex(list, text).data(role);
+}
+
+QStringList WindowTest::rows(const char *list) const
+{
+    const auto *model = qobject_cast<QAbstractItemView *>(widget(list))->model();
+    QStringList texts;
+    for (int row = 0; row < model->rowCount(); ++row)
+        texts << model->index(row, 0).data().toString();
+    return texts;
 }
 
 bool WindowTest::eventually(const std::function<bool()> &condition, int ms)

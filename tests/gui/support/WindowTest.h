@@ -3,7 +3,9 @@
 #include <gtest/gtest.h>
 
 #include <QDir>
+#include <QModelIndex>
 #include <QString>
+#include <QStringList>
 #include <QTemporaryDir>
 #include <QVariant>
 #include <QWidget>
@@ -54,6 +56,17 @@ protected:
     /// Types the number into a spin box.
     void enterNumber(const char *name, int number);
 
+    /// Clicks on the tab of that label.
+    void showPage(const QString &label);
+    /// Opens a combo box with the mouse and picks that item with the keys.
+    void choose(const char *name, const QString &item);
+    /// Clicks on the row of a list that shows that text; the test fails when none does, or only outside the visible part.
+    void chooseRow(const char *list, const QString &text);
+    /// A row of a list as shown: what it has for @p role, invalid when no row shows the text.
+    QVariant rowData(const char *list, const QString &text, int role) const;
+    /// The rows of a list, from the top.
+    QStringList rows(const char *list) const;
+
     /// Runs the event loop until @p condition holds. False when it does not within @p ms.
     static bool eventually(const std::function<bool()> &condition, int ms = 10000);
     /// Runs the event loop for a while, to see that something does not happen.
@@ -73,6 +86,8 @@ protected:
     static QByteArray contents(const QString &path);
 
 private:
+    QModelIndex rowIndex(const char *list, const QString &text) const;
+
     QTemporaryDir m_home;
     std::unique_ptr<MainWindow> m_window;
 };

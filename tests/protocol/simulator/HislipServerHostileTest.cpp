@@ -61,6 +61,15 @@ TEST_F(HostileHislip, RefusesDataBeforeTheSecondConnection)
     EXPECT_EQ(sync.receiveAll(), "");
 }
 
+TEST_F(HostileHislip, RefusesDataThatCameWithTheInitialization)
+{
+    RawClient sync(port);
+    sync.send(message("4853 00 00 01005A5A", "hislip0") + message("4853 07 00 FFFFFF00", "*IDN?\n"));
+    EXPECT_EQ(sync.receive(16).substr(0, 4), fromHex("4853 01 00"));
+    expectText(sync, "4853 02 02 00000000");
+    EXPECT_EQ(sync.receiveAll(), "");
+}
+
 TEST_F(HostileHislip, RefusesAThirdConnectionAndASecondInitialization)
 {
     RawClient sync(port);
@@ -101,6 +110,29 @@ TEST_F(HostileHislip, AnswersAnErrorToWhatItDoesNotKnowAndGoesOn)
     expectMessage(client.sync, "4853 07 00 FFFFFF00", "1\n");
 }
 
+TEST_F(HostileHislip, EndsWithAFatalErrorOfTheClientOnEitherChannel)
+{
+    for (const bool onAsync : {false, true}) {
+        HislipClient client(port);
+        client.async.send(message("4853 04 01 00000000"));
+        expectMessage(client.async, "4853 05 01 00000000");
+        (onAsync ? client.async : client.sync).send(message("4853 02 80 00000000", "out of paper"));
+        EXPECT_EQ(client.sync.receiveAll(), "");
+        EXPECT_EQ(client.async.receiveAll(), "");
+        EXPECT_EQ(ask("*OPC?\n"), "1\n") << "its lock is free";
+    }
+}
+
+TEST_F(HostileHislip, TakesAnErrorOfTheClientForWhatItIs)
+{
+    HislipClient client(port);
+    for (RawClient *channel : {&client.sync, &client.async})
+        channel->send(message("4853 03 01 00000000", "what was that?"));
+    client.sync.send(message("4853 07 00 FFFFFF00", "SYST:ERR?\n"));
+    expectMessage(client.sync, "4853 07 00 FFFFFF00", "0,\"No error\"\n");
+    EXPECT_TRUE(client.async.silentFor(50ms));
+}
+
 TEST_F(HostileHislip, RefusesAMessageSizeThatIsNoNumberOf8Bytes)
 {
     HislipClient client(port);
@@ -116,6 +148,49 @@ TEST_F(HostileHislip, DrainsAMessageThatIsTooLarge)
     EXPECT_EQ(expectText(client.sync, "4853 03 04 00000000"), "message too large");
     client.sync.send(message("4853 07 00 FFFFFF02", "SYST:ERR?\n"));
     expectMessage(client.sync, "4853 07 00 FFFFFF02", "0,\"No error\"\n");
+}
+
+TEST_F(HostileHislip, CountsAMessageThatIsTooLargeAsCome)
+{
+    HislipClient client(port);
+    client.sync.send(message("4853 07 00 FFFFFF00", "*CLS;*OPC?\n"));
+    expectMessage(client.sync, "4853 07 00 FFFFFF00", "1\n");
+    client.async.send(message("4853 04 01 00000000"));
+    expectMessage(client.async, "4853 05 01 00000000");
+    client.sync.send(message("4853 07 01 FFFFFF02", std::string(100'001, 'x')));
+    expectText(client.sync, "4853 03 04 00000000");
+    client.async.send(message("4853 04 00 FFFFFF02"));
+    expectMessage(client.async, "4853 05 01 00000000");
+    client.sync.send(message("4853 07 00 FFFFFF04", "SYST:ERR?\n"));
+    expectMessage(client.sync, "4853 07 00 FFFFFF04", "0,\"No error\"\n");
+}
+
+TEST_F(HostileHislip, KeepsAFewServiceRequestsForAClientThatSleeps)
+{
+    HislipClient sleeping(port);
+    sleeping.sync.send(message("4853 07 00 FFFFFF00", "*ESE 1;*SRE 32;*ESE?\n"));
+    expectMessage(sleeping.sync, "4853 07 00 FFFFFF00", "1\n");
+    RawClient busy(simulator.port("socket"));
+    // 16 bytes each: four times what the connection itself holds.
+    constexpr std::size_t Rounds = 200;
+    constexpr std::size_t RequestsPerRound = 5000;
+    std::string toggles;
+    for (std::size_t i = 0; i < RequestsPerRound; ++i)
+        toggles += "*OPC;*ESR?;";
+    for (std::size_t i = 0; i < Rounds; ++i) {
+        busy.send(toggles + "*CLS\n");
+        busy.receive(2 * RequestsPerRound);
+    }
+    sleeping.sync.send(message("4853 07 01 FFFFFF02", "*SRE 0;*OPC?\n"));
+    expectMessage(sleeping.sync, "4853 07 00 FFFFFF02", "1\n");
+    sleeping.async.send(message("4853 15 01 FFFFFF02"));
+    std::size_t requests = 0;
+    std::string header = sleeping.async.receive(16);
+    for (; header.starts_with("HS\x14"); header = sleeping.async.receive(16))
+        ++requests;
+    EXPECT_EQ(header, message("4853 16 00 00000000")) << "it can still talk";
+    EXPECT_GT(requests, 0u);
+    EXPECT_LT(requests, Rounds * RequestsPerRound / 2);
 }
 
 TEST_F(HostileHislip, StoresNoMoreOfEndlessDataThanItsLimit)

@@ -299,14 +299,6 @@ TEST_F(HislipServer, KeepsSettingsAcrossAClear)
     expectMessage(client.sync, "4853 07 00 FFFFFF00", "5;3;2.000000E+00\n");
 }
 
-TEST_F(HislipServer, OffersNoOverlappedModeInAClear)
-{
-    client.async.send(message("4853 13 00 00000000"));
-    expectMessage(client.async, "4853 17 00 00000000");
-    client.sync.send(message("4853 08 01 00000000"));
-    expectMessage(client.sync, "4853 09 00 00000000");
-}
-
 TEST_F(HislipServer, Triggers)
 {
     client.sync.send(message("4853 07 00 FFFFFF00", "TRIG:SOUR BUS;:INIT\n"));

@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include <array>
+#include <vector>
 
 using namespace test;
 
@@ -136,5 +137,17 @@ TEST_F(Portmapper, AnswersSeveralCallsOfOneConnection)
     for (int i = 0; i < 3; ++i) {
         tcp.send("00000003", "000607AF 00000001 00000006 00000000", {}, "00000002");
         EXPECT_EQ(tcp.results(), corePort);
+    }
+}
+
+TEST_F(Portmapper, SilentConnectionsKeepNobodyOut)
+{
+    for (const char *beginning : {"", "80000038 00000001"}) {
+        std::vector<RawClient> clients;
+        for (int i = 0; i < 300; ++i) {
+            clients.emplace_back(portmapperPort);
+            clients.back().trySend(fromHex(beginning));
+        }
+        EXPECT_EQ(askForPort(), port) << beginning;
     }
 }

@@ -132,6 +132,14 @@ TEST(SimulatorProgram, NamesABadOption)
     }
 }
 
+TEST(SimulatorProgram, SignsItsErrorsWhenAsked)
+{
+    SimulatorProcess simulator({"--socket", "0", "--signed-errors"});
+    RawClient client(simulator.port("socket"));
+    client.send("SYST:ERR?;:NONSENSE;:SYST:ERR?;ERR:ALL?;CODE?;COUN?\n");
+    EXPECT_EQ(client.receiveLine(), "+0,\"No error\";-113,\"Undefined header;:NONSENSE\";+0,\"No error\";+0;0\n");
+}
+
 TEST(SimulatorProgram, NamesAPortThatIsInUse)
 {
     SimulatorProcess first({"--socket", "0"});

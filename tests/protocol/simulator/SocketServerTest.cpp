@@ -116,6 +116,8 @@ TEST_F(SocketServer, ClosesWhatComesBeyondItsClients)
         clients.back().send("*OPC?\n");
         EXPECT_EQ(clients.back().receiveLine(), "1\n");
     }
+    client.send("*OPC?\n");
+    EXPECT_EQ(client.receiveLine(), "1\n");
     RawClient tooMany(port);
     EXPECT_EQ(tooMany.receiveAll(), "");
     for (RawClient &each : clients) {

@@ -10,7 +10,15 @@ namespace test
 class Vxi11Fixture : public SimulatorFixture
 {
 protected:
-    Vxi11Fixture() : SimulatorFixture({"--hislip", "0", "--socket", "0", "--vxi11", "0", "--portmapper", "0"}) {}
+    /// @p more: options beside the services.
+    explicit Vxi11Fixture(const std::vector<std::string> &more = {}) : SimulatorFixture(services(more)) {}
+
+    static std::vector<std::string> services(const std::vector<std::string> &more)
+    {
+        std::vector<std::string> options{"--hislip", "0", "--socket", "0", "--vxi11", "0", "--portmapper", "0"};
+        options.insert(options.end(), more.begin(), more.end());
+        return options;
+    }
 
     /// Asks the portmapper for the port of the core program.
     std::uint16_t askForPort() const
@@ -29,13 +37,13 @@ protected:
     const std::uint16_t port = askForPort();
 };
 
-/// One connection to the core program and one link to inst0 on it. Times are 30 s where a test does not care.
+/// One connection to the core program and one link on it. Times are 30 s where a test does not care.
 class Vxi11Client
 {
 public:
-    explicit Vxi11Client(std::uint16_t port) : core(port, "000607AF"), m_port(port)
+    explicit Vxi11Client(std::uint16_t port, std::string_view device = "inst0") : core(port, "000607AF"), m_port(port)
     {
-        const std::string result = core.call("0000000A", "00000001 00000000 00000000 00000005", "inst0");
+        const std::string result = core.call("0000000A", "00000001 00000000 00000000" + size(device), device);
         EXPECT_EQ(result.substr(0, 9), "00000000 ");
         link = result.substr(9, 8);
     }

@@ -123,3 +123,61 @@ TEST_F(Vxi11Interrupt, ConnectsBackToTheCallerAlone)
     EXPECT_EQ(client.core.call("0000001A"), "00000006 ");
     EXPECT_EQ(client.query("*OPC?\n"), "1\n");
 }
+
+namespace
+{
+
+class GatewayInterrupt : public Vxi11Fixture
+{
+protected:
+    GatewayInterrupt() : Vxi11Fixture({"--gpib"}) {}
+
+    static std::string enable(Vxi11Client &client, const std::string &handle)
+    {
+        return client.core.call("00000014", client.link + "00000001" + Vxi11Client::size(handle), handle);
+    }
+};
+
+} // namespace
+
+TEST_F(GatewayInterrupt, TellsTheLinksOfTheInstrumentThatRequestsServiceAndThoseOfTheBus)
+{
+    Vxi11Client second(port, "gpib0,7");
+    Vxi11Client other(port, "gpib0,5");
+    Vxi11Client bus(port, "gpib0");
+    std::promise<void> seen;
+    std::promise<void> seenByBus;
+    ScriptedPeer controller([&](ScriptedPeer &self) {
+        PeerConnection channel = self.accept();
+        channel.expect(hex("80000030 00000001") + hex(Header) + hex("00000002") + "s7" + std::string(2, '\0'));
+        seen.set_value();
+        channel.expectClosed();
+    });
+    ScriptedPeer controllerOfOther([](ScriptedPeer &self) {
+        PeerConnection channel = self.accept();
+        channel.expectClosed(); // and nothing before
+    });
+    ScriptedPeer controllerOfBus([&](ScriptedPeer &self) {
+        PeerConnection channel = self.accept();
+        channel.expect(hex("80000030 00000001") + hex(Header) + hex("00000003") + "bus" + std::string(1, '\0'));
+        seenByBus.set_value();
+        channel.expectClosed();
+    });
+    const auto create = [](Vxi11Client &client, std::uint16_t listening) {
+        return client.core.call("00000019", "7F000001" + RpcCaller::digits(RpcCaller::word(listening)) +
+                                                "000607B1 00000001 00000000");
+    };
+    ASSERT_EQ(create(second, controller.port()), "00000000 ");
+    ASSERT_EQ(create(other, controllerOfOther.port()), "00000000 ");
+    ASSERT_EQ(create(bus, controllerOfBus.port()), "00000000 ");
+    ASSERT_EQ(enable(second, "s7"), "00000000 ");
+    ASSERT_EQ(enable(other, "s5"), "00000000 ");
+    ASSERT_EQ(enable(bus, "bus"), "00000000 ");
+    second.write("*SRE 16\n");
+    second.write("*IDN?\n");
+    EXPECT_EQ(seen.get_future().wait_for(std::chrono::seconds(30)), std::future_status::ready);
+    EXPECT_EQ(seenByBus.get_future().wait_for(std::chrono::seconds(30)), std::future_status::ready);
+    EXPECT_EQ(second.statusByte(), "00000000 00000050 ");
+    for (Vxi11Client *client : {&second, &other, &bus})
+        EXPECT_EQ(client->core.call("0000001A"), "00000000 ");
+}

@@ -100,6 +100,7 @@ shown = subprocess.run(
 seen = {int(kind, 0) for kind in shown.replace("\n", ",").split(",") if kind}
 wanted = set(range(26)) | {39}
 malformed = subprocess.run(["tshark", "-r", str(recording), "-Y", "_ws.malformed || hislip.wrongprologue || hislip.msgnotnull"], capture_output=True, text=True, check=True).stdout
+print(subprocess.run(["tshark", "--version"], capture_output=True, text=True, check=True).stdout.splitlines()[0])
 print("message types seen:", sorted(seen))
 print("malformed packets:", malformed or "none")
 sys.exit(0 if seen == wanted and not malformed else 1)

@@ -1,5 +1,5 @@
 #!/usr/bin/python3
-"""Lets programs of other makers talk VXI-11 to the simulator, and prints their versions and what was said.
+"""Lets programs of other makers talk VXI-11 and over a raw socket to the simulator, lets one read the packets, and prints their versions and what was said.
 
 The simulator runs with its default services, portmapper 111 included, in a network of its own.
 
@@ -8,11 +8,14 @@ Usage: vxi11-strangers.py SIMULATOR [FOLDER_OF_UNPACKED_PACKAGES]. Status 1 when
 import os
 import re
 import shutil
+import signal
 import subprocess
 import sys
+import tempfile
 
 IDENTIFICATION = "Oltrava,KyVisaSimulator,100001,5.8.6"
 RESOURCE = "TCPIP::127.0.0.1::inst0::INSTR"
+SOCKET = "TCPIP::127.0.0.1::5025::SOCKET"
 
 if "--inside" not in sys.argv:
     inside = ["unshare", "-n" if os.geteuid() == 0 else "-rn", sys.executable, *sys.argv, "--inside"]
@@ -84,14 +87,32 @@ def pure_python_visa():
     expect("after a clear", instrument.query("*CLS;*OPC?"), "1\n")
     instrument.close()
 
+    print("the same over a raw socket")
+    raw = pyvisa.ResourceManager("@py").open_resource(SOCKET, timeout=10000, read_termination="\n", write_termination="\n")
+    expect("*IDN?", raw.query("*IDN?"), IDENTIFICATION)
+    expect("the 3 MiB block of before", raw.query_binary_values("MMEM:DATA? 'f'", "B", container=bytes) == content, True)
+    raw.write_raw(b"MMEM:DATA 'g',#73145728" + content[::-1] + b"\n")
+    expect("another one, there and back", raw.query_binary_values("MMEM:DATA? 'g'", "B", container=bytes) == content[::-1], True)
+    raw.timeout = 200
+    try:
+        expect("read without a query", raw.read(), "a time-out")
+    except pyvisa.VisaIOError as error:
+        expect("read without a query", error.error_code, pyvisa.constants.VI_ERROR_TMO)
+    raw.timeout = 10000
+    expect("and no error, since nobody sees it", raw.query("SYST:ERR?"), '0,"No error"')
+    raw.close()
+
 
 def lxi_tools():
     lxi = stranger("lxi")
     print(run(lxi, "--version").strip())
     expect("scpi *IDN?", run(lxi, "scpi", "--address", "127.0.0.1", "*IDN?").strip(), IDENTIFICATION)
     expect("scpi that answers nothing", run(lxi, "scpi", "--address", "127.0.0.1", "*CLS"), "")
-    rate = re.search(r"Result: (\S+) requests/second", run(lxi, "benchmark", "--address", "127.0.0.1", "--count", "500"))
-    expect("benchmark, requests a second", float(rate[1]) if rate else 0, lambda got: got > 0)
+    raw = ("--address", "127.0.0.1", "--raw", "--port", "5025")
+    expect("scpi *IDN? raw", run(lxi, "scpi", *raw, "*IDN?").strip(), IDENTIFICATION)
+    for what, words in (("benchmark", ("--address", "127.0.0.1")), ("benchmark raw", raw)):
+        rate = re.search(r"Result: (\S+) requests/second", run(lxi, "benchmark", *words, "--count", "500"))
+        expect(what + ", requests a second", float(rate[1]) if rate else 0, lambda got: got > 0)
     expect("discover", run(lxi, "discover", "--timeout", "1"), lambda got: f'Found "{IDENTIFICATION}" on address 127.0.0.1' in got)
 
 
@@ -122,6 +143,37 @@ def second_simulator():
     expect("its message", third.stderr, "KyVisaSimulator: portmapper: cannot listen on 127.0.0.1 port 111: Address already in use\n")
 
 
+class Recording:
+    """What an independent dissector makes of the packets."""
+
+    # Calls of these procedures must be seen; 10 to 23 are core, 3 is the portmapper's question for the port.
+    FILTERS = {"create_link": "vxi11_core.procedure_v1 == 10", "device_write": "vxi11_core.procedure_v1 == 11",
+               "device_read": "vxi11_core.procedure_v1 == 12", "device_readstb": "vxi11_core.procedure_v1 == 13",
+               "device_clear": "vxi11_core.procedure_v1 == 15", "device_lock": "vxi11_core.procedure_v1 == 18",
+               "destroy_link": "vxi11_core.procedure_v1 == 23", "portmapper": "portmap"}
+
+    def __init__(self, folder):
+        self.file = os.path.join(folder, "vxi11.pcapng")
+        self.process = subprocess.Popen(["tshark", "-i", "lo", "-q", "-w", self.file], stderr=subprocess.PIPE, text=True)
+        for line in self.process.stderr:
+            if "Capture started" in line:
+                break
+
+    def shown(self, what):
+        words = ["tshark", "-r", self.file, "-Y", what, "-T", "fields", "-e", "frame.number"]
+        return subprocess.run(words, capture_output=True, text=True, check=True, timeout=60).stdout.split()
+
+    def end(self):
+        self.process.send_signal(signal.SIGINT)
+        self.process.communicate(timeout=60)
+        version = subprocess.run(["tshark", "--version"], capture_output=True, text=True, check=True).stdout
+        print(version.splitlines()[0])
+        for name, what in self.FILTERS.items():
+            expect(f"packets of {name}", len(self.shown(what)), lambda count: count > 0)
+        # A client's port that happens to be known for something else makes it read raw messages as that.
+        expect("malformed packets", self.shown("rpc && _ws.malformed"), [])
+
+
 simulator = subprocess.Popen([SIMULATOR], stdout=subprocess.PIPE, text=True)
 try:
     said = []
@@ -130,9 +182,12 @@ try:
     print("KyVisaSimulator")
     expect("services", said, ["hislip TCPIP::127.0.0.1::hislip0,4880::INSTR", "socket TCPIP::127.0.0.1::5025::SOCKET",
                               "vxi11 " + RESOURCE, "portmapper 127.0.0.1 111", "ready"])
-    pure_python_visa()
-    lxi_tools()
-    rpcinfo()
+    with tempfile.TemporaryDirectory() as folder:
+        recording = Recording(folder)
+        pure_python_visa()
+        lxi_tools()
+        rpcinfo()
+        recording.end()
     second_simulator()
 finally:
     simulator.terminate()

@@ -115,6 +115,8 @@ Answer enter(Call call)
         std::this_thread::sleep_for(answer.delay);
     if (answer.gate)
         answer.gate->pass();
+    if (answer.then)
+        answer.then();
     return answer;
 }
 

@@ -4,6 +4,7 @@
 
 #include <chrono>
 #include <condition_variable>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -60,6 +61,7 @@ struct Answer {
     std::vector<std::uint64_t> numbers = {};
     std::chrono::microseconds delay{0};
     std::shared_ptr<Gate> gate = nullptr;
+    std::function<void()> then = nullptr; ///< something that happens during the call, after the waiting
 };
 
 /// One call as it came in.

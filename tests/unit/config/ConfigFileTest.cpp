@@ -215,6 +215,27 @@ TEST_F(ConfigFile, RefusesToSaveAReadOnlyFileAndLeavesItAlone)
     EXPECT_EQ(content(), before);
 }
 
+TEST_F(ConfigFile, ASaveThatWasRefusedLeavesNothingToBeWrittenLater)
+{
+    const std::string before = "[SOCKET-RSRCS]\nName0 = A\n";
+    write(before);
+    const QByteArray name = path().toLocal8Bit();
+    ASSERT_EQ(chmod(folder().toLocal8Bit().constData(), 0755), 0);
+    ASSERT_TRUE(geteuid() != 0 || chown(name.constData(), 65534, 65534) == 0);
+    ASSERT_EQ(chmod(name.constData(), 0444), 0);
+    const int answer = asNobody([&name] {
+        KyConfigFile file(QString::fromLocal8Bit(name));
+        file.load();
+        file.setListOfResource({});
+        const bool saved = file.save();
+        const bool unlocked = chmod(name.constData(), 0644) == 0;
+        file.load();
+        return (saved ? 1 : 0) + (unlocked ? 0 : 2) + (file.listOfResources().size() == 1 ? 0 : 4);
+    });
+    EXPECT_EQ(answer, 0);
+    EXPECT_EQ(content(), before);
+}
+
 TEST_F(ConfigFile, SavesAWritableFileInAFolderThatIsNot)
 {
     write("[SOCKET-RSRCS]\nName0 = A\n");

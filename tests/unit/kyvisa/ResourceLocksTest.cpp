@@ -1,5 +1,7 @@
 #include "kyvisa/core/ResourceLocks.h"
+#include "kyvisa/core/Interruptions.h"
 #include "kyvisa/include/visa.h"
+#include "support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
 #include <thread>
@@ -14,16 +16,17 @@ class Locks : public testing::Test
 protected:
     ViStatus exclusive(const int &holder, ViUInt32 timeout = VI_TMO_IMMEDIATE)
     {
-        return m_locks.lock(&holder, VI_EXCLUSIVE_LOCK, timeout, {}, m_closing, m_key);
+        return m_locks.lock(&holder, VI_EXCLUSIVE_LOCK, timeout, {}, CallWatch(m_interruptions), m_key);
     }
     ViStatus shared(const int &holder, const std::string &key = {}, ViUInt32 timeout = VI_TMO_IMMEDIATE)
     {
-        return m_locks.lock(&holder, VI_SHARED_LOCK, timeout, key, m_closing, m_key);
+        return m_locks.lock(&holder, VI_SHARED_LOCK, timeout, key, CallWatch(m_interruptions), m_key);
     }
     ViStatus unlock(const int &holder) { return m_locks.unlock(&holder); }
 
-    ResourceLocks m_locks;
-    std::atomic<bool> m_closing{false};
+    test::TemporaryFolder m_folder;
+    ResourceLocks m_locks{MachineLocks(std::make_shared<os::LockFile>(m_folder.file("locks")), "resource")};
+    Interruptions m_interruptions;
     std::string m_key;
     int m_a = 0;
     int m_b = 0;
@@ -114,7 +117,7 @@ TEST_F(Locks, UnlockLetsTheNextOneIn)
     ASSERT_EQ(exclusive(m_a), VI_SUCCESS);
     std::thread waiting([&] {
         std::string key;
-        EXPECT_EQ(m_locks.lock(&m_b, VI_EXCLUSIVE_LOCK, 20000, {}, m_closing, key), VI_SUCCESS);
+        EXPECT_EQ(m_locks.lock(&m_b, VI_EXCLUSIVE_LOCK, 20000, {}, CallWatch(m_interruptions), key), VI_SUCCESS);
     });
     EXPECT_EQ(unlock(m_a), VI_SUCCESS);
     waiting.join();
@@ -126,9 +129,10 @@ TEST_F(Locks, ClosingEndsAWaitWithoutEnd)
     ASSERT_EQ(exclusive(m_a), VI_SUCCESS);
     std::thread waiting([&] {
         std::string key;
-        EXPECT_EQ(m_locks.lock(&m_b, VI_EXCLUSIVE_LOCK, VI_TMO_INFINITE, {}, m_closing, key), VI_ERROR_INV_OBJECT);
+        EXPECT_EQ(m_locks.lock(&m_b, VI_EXCLUSIVE_LOCK, VI_TMO_INFINITE, {}, CallWatch(m_interruptions), key),
+                  VI_ERROR_INV_OBJECT);
     });
-    m_closing = true;
+    m_interruptions.closing = true;
     m_locks.wake();
     waiting.join();
 }
@@ -145,7 +149,8 @@ TEST_F(Locks, ForgettingAHolderFreesEverythingItHeld)
 
 TEST(LockRegistry, KnowsAResourceByItsNameWithoutCase)
 {
-    LockRegistry registry;
+    const test::TemporaryFolder folder;
+    LockRegistry registry(folder.file("locks"));
     const auto one = registry.locksOf("TCPIP0::Box::hislip0::INSTR");
     EXPECT_EQ(registry.locksOf("tcpip0::box::HISLIP0::instr"), one);
     EXPECT_NE(registry.locksOf("TCPIP0::box::hislip1::INSTR"), one);

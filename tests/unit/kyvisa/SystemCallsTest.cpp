@@ -5,7 +5,8 @@
 #include "kyvisa/include/visa.h"
 #include "kyvisa/os/Connector.h"
 #include "kyvisa/os/Resolver.h"
-#include "kyvisa/transport/HislipTransport.h"
+#include "kyvisa/transport/HislipConnector.h"
+#include "kyvisa/transport/Transport.h"
 #include "support/HislipPeer.h"
 #include "support/ScriptedPeer.h"
 #include "support/Stopwatch.h"
@@ -19,6 +20,7 @@
 #include <netinet/in.h>
 #include <netinet/tcp.h>
 #include <thread>
+#include <vector>
 
 using namespace kyvisa::os;
 using test::ScriptedPeer;
@@ -269,7 +271,7 @@ TEST(HislipTransport, ConnectsTwiceToOneAddressOfAHostThatHasSeveral)
     const ReplacedSystemCalls replaced(seam);
     kyvisa::AttributeStore attributes(kyvisa::kind::Hislip);
     std::unique_ptr<kyvisa::Transport> transport;
-    EXPECT_EQ(kyvisa::HislipTransport::connect(name, within(20000, nobody), attributes, transport), VI_SUCCESS);
+    EXPECT_EQ(kyvisa::connectHislip(name, within(20000, nobody), attributes, transport), VI_SUCCESS);
     EXPECT_EQ(questions, 1);
 }
 
@@ -366,6 +368,96 @@ TEST(StreamSocket, SurvivesInterruptedAndShortCalls)
     const Transfer got = socket.receive(buffer, within(20000, nobody));
     EXPECT_EQ(got.result, IoResult::Done);
     EXPECT_EQ(got.count, 1u);
+}
+
+/// The flags of every recv, oldest first.
+std::vector<int> g_receptions;
+
+/// Receives from a silent peer until the time is up.
+std::vector<int> receptionsOfASilentPeer(SystemCalls &seam, int milliseconds)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
+    const Wakeup nobody;
+    const ReplacedSystemCalls replaced(seam);
+    StreamSocket socket;
+    EXPECT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    g_receptions.clear();
+    std::array<std::byte, 10> buffer;
+    const Stopwatch watch;
+    EXPECT_EQ(socket.receive(buffer, within(milliseconds, nobody)).result, IoResult::TimedOut);
+    EXPECT_GE(watch.milliseconds(), milliseconds);
+    return g_receptions;
+}
+
+SystemCalls withReceptionsNoted()
+{
+    SystemCalls seam = realSystemCalls();
+    seam.recv = [](int descriptor, void *buffer, size_t size, int flags) -> ssize_t {
+        g_receptions.push_back(flags);
+        return ::recv(descriptor, buffer, size, flags);
+    };
+    return seam;
+}
+
+TEST(StreamSocket, WaitsInTheSystemForAMomentAndThenWhereItCanBeWoken)
+{
+    SystemCalls seam = withReceptionsNoted();
+    EXPECT_EQ(receptionsOfASilentPeer(seam, 200), std::vector<int>{0});
+}
+
+TEST(StreamSocket, PollsAtOnceWhenLittleTimeIsLeft)
+{
+    SystemCalls seam = withReceptionsNoted();
+    EXPECT_EQ(receptionsOfASilentPeer(seam, 20), std::vector<int>{MSG_DONTWAIT});
+}
+
+TEST(StreamSocket, PollsWhereTheSystemWillNotEndAWait)
+{
+    SystemCalls seam = withReceptionsNoted();
+    seam.setsockopt = [](int descriptor, int level, int option, const void *value, socklen_t length) {
+        if (level == SOL_SOCKET && option == SO_RCVTIMEO) {
+            failWith(ENOPROTOOPT);
+            return -1;
+        }
+        return ::setsockopt(descriptor, level, option, value, length);
+    };
+    EXPECT_EQ(receptionsOfASilentPeer(seam, 200), std::vector<int>{MSG_DONTWAIT});
+}
+
+TEST(StreamSocket, SignalsDoNotMakeAMomentLonger)
+{
+    SystemCalls seam = withReceptionsNoted();
+    seam.recv = [](int descriptor, void *buffer, size_t size, int flags) -> ssize_t {
+        g_receptions.push_back(flags);
+        if (flags == MSG_DONTWAIT || g_receptions.size() > 10)
+            return ::recv(descriptor, buffer, size, flags);
+        failWith(EINTR);
+        return -1;
+    };
+    EXPECT_EQ(receptionsOfASilentPeer(seam, 200), std::vector<int>{0});
+}
+
+TEST(StreamSocket, AWriteNeverWaitsInTheSystem)
+{
+    SystemCalls seam = realSystemCalls();
+    static std::atomic<int> flagsOfTheWrite;
+    seam.sendmsg = [](int descriptor, const msghdr *message, int flags) -> ssize_t {
+        flagsOfTheWrite = flags;
+        return ::sendmsg(descriptor, message, flags);
+    };
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        test::PeerConnection client = self.accept();
+        client.expect("x");
+        client.expectClosed();
+    });
+    const Wakeup nobody;
+    const ReplacedSystemCalls replaced(seam);
+    StreamSocket socket;
+    ASSERT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    std::byte letter{'x'};
+    std::array pieces = {iovec{&letter, 1}};
+    EXPECT_EQ(socket.send(pieces, within(20000, nobody)).result, IoResult::Done);
+    EXPECT_NE(flagsOfTheWrite & MSG_DONTWAIT, 0);
 }
 
 TEST(StreamSocket, ResetIsAClosedConnection)

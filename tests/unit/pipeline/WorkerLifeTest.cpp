@@ -11,9 +11,10 @@ namespace
 {
 using WorkerLife = RunningWorker;
 
-TEST_F(WorkerLife, OpensAResourceManagerAtOnce)
+TEST_F(WorkerLife, OpensItsResourceManagersAtOnce)
 {
-    EXPECT_THAT(standin::operations(), ElementsAre("viOpenDefaultRM"));
+    // Of the session and of the two tests.
+    EXPECT_THAT(standin::operations(), ElementsAre("viOpenDefaultRM", "viOpenDefaultRM", "viOpenDefaultRM"));
     EXPECT_THAT(logLines(), testing::IsEmpty());
 }
 
@@ -76,13 +77,13 @@ TEST_F(WorkerLife, PanelsAndTestsHaveLogsOfTheirOwnInOneRing)
     EXPECT_THAT(logLines(), ElementsAre("from a test"));
 }
 
-TEST_F(WorkerLife, ReopensItsResourceManager)
+TEST_F(WorkerLife, ReopensItsResourceManagers)
 {
     open();
     m_thread.closeRM();
     EXPECT_EQ(standin::openObjects(), 0u);
     m_thread.openRM();
-    EXPECT_EQ(standin::openObjects(), 1u);
+    EXPECT_EQ(standin::openObjects(), 3u);
     open();
 }
 

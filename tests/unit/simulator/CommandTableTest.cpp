@@ -110,5 +110,7 @@ TEST_F(Table, ReadsNumericSuffixes)
     EXPECT_EQ(suffixes, std::vector<unsigned>{12}) << "the path keeps its suffix";
     EXPECT_EQ(find(":OUTP0?"), "OUTPut#[:STATe]?");
     EXPECT_EQ(suffixes, std::vector<unsigned>{0});
-    EXPECT_EQ(find(":SYST2:ERR?"), "-113");
+    EXPECT_EQ(find(":SYST2:ERR?"), "-114") << "it takes none";
+    EXPECT_EQ(find(":SYST:ERR1?"), "-114");
+    EXPECT_EQ(find(":NONE2:ERR?"), "-113");
 }

@@ -14,6 +14,44 @@ TEST_F(CommonCommands, StartWithThePowerOnBit)
     EXPECT_EQ(client.ask("*STB?"), "0\n");
 }
 
+TEST_F(CommonCommands, StartAsPowerOnStatusClearSays)
+{
+    client.ask("*ESE 128;*SRE 32;*CLS;:VOLT 5;:OUTP ON;:DISP:TEXT 'x';:STAT:QUES:ENAB 1;:MMEM:DATA 'f',#11x;:NONSENSE");
+    client.exchange.poll();
+    client.serviceRequests.clear();
+    other.serviceRequests.clear();
+    client.ask("SIM:POW:CYCL");
+    EXPECT_EQ(client.serviceRequests, std::vector<std::uint8_t>{}) << "*PSC is 1: the enables are cleared";
+    EXPECT_EQ(client.ask("*ESR?;*ESE?;*SRE?;:STAT:QUES:ENAB?;:SYST:ERR?"), "128;0;0;0;0,\"No error\"\n");
+    EXPECT_EQ(client.ask("VOLT?;:OUTP?;:DISP:TEXT?;:MMEM:DATA? 'f';*PSC?"), "0.000000E+00;0;\"\";#11x;1\n");
+
+    client.ask("*PSC 0;*ESE 128;*SRE 32");
+    client.ask("SIM:POW:CYCL");
+    EXPECT_EQ(client.serviceRequests, (std::vector<std::uint8_t>{0x60})) << "it asks for service because it was off";
+    EXPECT_EQ(other.serviceRequests.size(), 1u);
+    EXPECT_EQ(client.exchange.poll(), 0x60);
+    EXPECT_EQ(client.ask("*ESR?;*ESE?;*SRE?;*PSC?"), "128;128;32;0\n");
+}
+
+TEST_F(CommonCommands, EndWhatIsPendingWhenThePowerGoes)
+{
+    client.ask("SENS:APER 60;:INIT");
+    EXPECT_EQ(client.ask("*OPC?"), "");
+    other.ask("*OPC;:SIM:POW:CYCL");
+    timers.turn();
+    EXPECT_EQ(client.takeAnswers(), "1\n") << "nothing is pending any more";
+    EXPECT_EQ(other.ask("*ESR?;:STAT:OPER:COND?"), "128;0\n") << "and nobody is told that it completed";
+}
+
+TEST_F(CommonCommands, RequestServiceAtEachPowerOn)
+{
+    client.ask("*PSC 0;*ESE 128;*SRE 32");
+    EXPECT_EQ(client.serviceRequests.size(), 1u);
+    client.exchange.poll();
+    client.ask("SIM:POW:CYCL");
+    EXPECT_EQ(client.serviceRequests.size(), 2u) << "the bit that nobody has read came anew";
+}
+
 TEST_F(CommonCommands, KeepTheirEnables)
 {
     EXPECT_EQ(client.ask("*ESE 255;*SRE 255;*ESE?;*SRE?"), "255;191\n") << "bit 6 of *SRE does not count";

@@ -2,6 +2,7 @@
 
 #include "simulator/instrument/Timers.h"
 
+#include <algorithm>
 #include <map>
 #include <utility>
 
@@ -33,6 +34,19 @@ public:
             action();
         }
         m_now = until;
+    }
+
+    /// Runs the one that is due first, whenever that is. False when there is none.
+    bool turnToNext()
+    {
+        if (m_timers.empty())
+            return false;
+        const auto timer = m_timers.begin();
+        m_now = std::max(m_now, timer->first.first);
+        const std::function<void()> action = std::move(timer->second);
+        m_timers.erase(timer);
+        action();
+        return true;
     }
 
     std::size_t waiting() const { return m_timers.size(); }

@@ -225,6 +225,25 @@ TEST(InputBuffer, MarksAUnitThatIsTooLong)
     EXPECT_TRUE(reader.units[2].whole);
 }
 
+TEST(InputBuffer, KeepsNoMoreBlocksThanAUnitMayHaveParameters)
+{
+    const auto budget = std::make_shared<ByteBudget>(1'000'000);
+    InputBuffer buffer(budget, {100'000'000, 10'000}, true);
+    std::string text = "D #11a";
+    for (int i = 0; i < 50'000; ++i)
+        text += i % 2 == 0 ? ",#10" : ",#11b";
+    std::span<const std::byte> bytes = std::as_bytes(std::span{text});
+    EXPECT_EQ(buffer.scan(bytes), InputBuffer::Found::Nothing);
+    EXPECT_LE(buffer.unit().blocks.size(), 1024u);
+    EXPECT_TRUE(buffer.unit().overrun);
+    EXPECT_EQ(buffer.end(), InputBuffer::Found::Message);
+    buffer.nextUnit();
+    bytes = std::as_bytes(std::span{std::string_view{"D #11c\n"}});
+    EXPECT_EQ(buffer.scan(bytes), InputBuffer::Found::Message);
+    EXPECT_FALSE(buffer.unit().overrun);
+    EXPECT_EQ(buffer.unit().blocks.size(), 1u);
+}
+
 TEST(InputBuffer, MarksAMessageThatIsTooLongAndRecoversWithTheNext)
 {
     Reader reader(true, {50, 100}, 1000);

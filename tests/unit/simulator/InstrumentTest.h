@@ -12,8 +12,8 @@ protected:
     static simulator::InstrumentOptions options()
     {
         simulator::InstrumentOptions result;
-        result.version = "1.2.3";
-        result.serial = "4711";
+        result.identification.firmware = "1.2.3";
+        result.identification.serial = "4711";
         result.maxMessage = 2'000'000;
         result.massMemory = 3'000'000;
         return result;

@@ -36,6 +36,22 @@ TEST_F(SourceMeasure, ObeysItsCurrentLimit)
     EXPECT_NEAR(ask("MEAS:VOLT?"), 5, 0.01);
 }
 
+TEST_F(SourceMeasure, SwitchesAProtectedOutputOffAtItsLimit)
+{
+    client.ask("*CLS;:STAT:QUES:ENAB 2;*SRE 8;:SIM2:LOAD 10;:SOUR2:VOLT 5;CURR 0.1;CURR:PROT ON;:OUTP2 ON");
+    EXPECT_EQ(client.ask("OUTP2?;:SOUR2:CURR:PROT:TRIP?;:STAT:QUES:COND?"), "0;1;2\n");
+    EXPECT_EQ(client.exchange.poll(), 0x48) << "and asks for service";
+    EXPECT_NEAR(ask("MEAS2:CURR?"), 0, 0.001);
+    client.ask("OUTP2 ON");
+    EXPECT_EQ(client.ask("SYST:ERR?"), "-221,\"Settings conflict;protection has tripped\"\n");
+    client.ask("SIM2:LOAD 100;:OUTP2:PROT:CLE;:OUTP2 ON");
+    EXPECT_EQ(client.ask("OUTP2?;:SOUR2:CURR:PROT:TRIP?;:STAT:QUES:COND?;:SYST:ERR?"), "1;0;0;0,\"No error\"\n");
+    client.ask("SIM2:LOAD 10");
+    EXPECT_EQ(client.ask("OUTP2?;:CURR:PROT:TRIP?;:SOUR2:CURR:PROT:TRIP?"), "0;0;1\n") << "the load alone trips it too";
+    client.ask("*RST");
+    EXPECT_EQ(client.ask("SOUR2:CURR:PROT:TRIP?;:STAT:QUES:COND?"), "0;0\n");
+}
+
 TEST_F(SourceMeasure, MakesNoiseThatTheSeedRepeats)
 {
     const std::string first = client.ask("MEAS:VOLT?");
