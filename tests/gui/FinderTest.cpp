@@ -50,12 +50,10 @@ TEST_F(FinderInWindow, ASearchReadsTheLxiTextsOfEachResource)
     inFinder({search(), [this] { return foundAll(); }, cancel()});
     EXPECT_EQ(standin::calls("viFindRsrc").at(0).texts.at(0), "?*");
     EXPECT_EQ(standin::calls("viFindNext").size(), 2u);
-    EXPECT_TRUE(eventually([this] {
-        return logRow("viFindRsrc(vi= 1, expr= ?*, findList= 1001, retcnt= 3, instrDesc= TCPIP::a::hislip0::INSTR)") >=
-               0;
-    }));
+    // Its lines come into the view in their order: the last one brings all.
+    EXPECT_TRUE(eventually([this] { return logRow("viClose(objectid= 1001)") >= 0; }));
+    EXPECT_GE(logRow("viFindRsrc(vi= 1, expr= ?*, findList= 1001, retcnt= 3, instrDesc= TCPIP::a::hislip0::INSTR)"), 0);
     EXPECT_GE(logRow("viFindNext(findList=1001, instrDesc= ASRL1::INSTR)"), 0);
-    EXPECT_GE(logRow("viClose(objectid= 1001)"), 0);
 }
 
 TEST_F(FinderInWindow, ClosedInTheMiddleOfASearchGivesTheWindowBack)

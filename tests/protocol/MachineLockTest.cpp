@@ -1,4 +1,5 @@
 // Locks between real processes, on a resource whose protocol has none: what holds, and what is left when a holder dies.
+#include "support/QuietFork.h"
 #include "support/ScriptedPeer.h"
 #include "support/VisaSession.h"
 
@@ -30,7 +31,7 @@ public:
         std::array<int, 2> ends{};
         if (::pipe(ends.data()) != 0)
             return;
-        m_process = ::fork();
+        m_process = test::forkWhileOthersWait();
         if (m_process == 0) {
             ::alarm(60);
             VisaSession session;

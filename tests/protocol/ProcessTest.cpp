@@ -1,5 +1,6 @@
 // The library as a guest in a process: fork, dlopen under two names, no threads and no output of its own.
 #include "support/HislipPeer.h"
+#include "support/QuietFork.h"
 #include "support/VisaSession.h"
 
 #include <atomic>
@@ -37,7 +38,7 @@ std::size_t entries(const char *folder)
 template <typename Child>
 int inFork(Child child)
 {
-    const pid_t pid = ::fork();
+    const pid_t pid = test::forkWhileOthersWait();
     if (pid == 0) {
         ::alarm(30); // a child that hangs ends by a signal and fails the test
         ::_exit(child());

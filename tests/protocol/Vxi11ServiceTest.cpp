@@ -1,6 +1,7 @@
 // Service requests over VXI-11: the interrupt channel, and instruments that get it wrong.
 #include "support/Vxi11Instrument.h"
 
+#include "support/QuietFork.h"
 #include "support/RawClient.h"
 #include "support/Stopwatch.h"
 
@@ -272,7 +273,7 @@ TEST(Vxi11Service, AForkedChildThatClosesLeavesLinkAndChannelToItsParent)
     VisaSession &session = instrument.session;
     ASSERT_EQ(enable(session), VI_SUCCESS);
     EXPECT_EQ(wait(session), VI_SUCCESS);
-    const pid_t child = ::fork();
+    const pid_t child = test::forkWhileOthersWait();
     if (child == 0) {
         ::alarm(30); // a child that hangs ends by a signal and fails the test
         ::_exit(session.write("x") == VI_ERROR_CONN_LOST && viClose(session.rm) == VI_SUCCESS ? 0 : 1);

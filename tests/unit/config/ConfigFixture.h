@@ -1,6 +1,7 @@
 #pragma once
 
 #include "config/kyconfigfile.h"
+#include "support/QuietFork.h"
 
 #include <QFile>
 #include <QTemporaryDir>
@@ -68,7 +69,7 @@ protected:
     template <typename Action>
     static int asNobody(Action action)
     {
-        const pid_t child = fork();
+        const pid_t child = test::forkWhileOthersWait();
         if (child == 0) {
             if (geteuid() == 0 && (setgid(65534) != 0 || setuid(65534) != 0))
                 _exit(100);
