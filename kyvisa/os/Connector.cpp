@@ -36,12 +36,27 @@ private:
     IoResult startNext();
     IoResult waitAndCollect(const WaitLimit &limit, Deadline nextStart);
     void win(std::size_t index);
+    /// Nobody was reached.
+    IoResult lost() const { return m_portsUsedUp ? IoResult::NoMemory : IoResult::NoAddress; }
 
     std::vector<Address> m_addresses;
     std::size_t m_next = 0;
     std::vector<int> m_running;
     StreamSocket m_winner;
+    bool m_portsUsedUp = false;
 };
+
+/// connect() calls an address unavailable when this machine has no way there, and also when all local ports towards it are in
+/// use. A datagram socket needs the way alone.
+bool hasWayTo(const Address &address)
+{
+    const int descriptor = systemCalls().socket(address.storage.ss_family, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+    if (descriptor < 0)
+        return false;
+    const bool reachable = systemCalls().connect(descriptor, address.get(), address.length) == 0;
+    systemCalls().close(descriptor);
+    return reachable;
+}
 
 IoResult Race::run(const WaitLimit &limit, StreamSocket &winner)
 {
@@ -65,7 +80,7 @@ IoResult Race::run(const WaitLimit &limit, StreamSocket &winner)
             return IoResult::Done;
         }
         if (!hasNext() && m_running.empty())
-            return IoResult::NoAddress;
+            return lost();
     }
 }
 
@@ -80,8 +95,10 @@ IoResult Race::startNext()
     if (systemCalls().connect(descriptor, address.get(), address.length) == 0) {
         win(m_running.size() - 1);
     } else if (errno != EINPROGRESS && errno != EINTR) {
+        const bool unavailable = errno == EADDRNOTAVAIL;
         systemCalls().close(descriptor);
         m_running.pop_back();
+        m_portsUsedUp = m_portsUsedUp || (unavailable && hasWayTo(address));
     }
     return IoResult::Done;
 }

@@ -1,11 +1,8 @@
 // VXI-11, byte by byte, against scripted instruments: opening, transfers, attributes, the calls without data.
+#include "support/SocketOptions.h"
 #include "support/Vxi11Instrument.h"
 
-#include <dirent.h>
 #include <gtest/gtest.h>
-#include <netinet/in.h>
-#include <netinet/tcp.h>
-#include <sys/socket.h>
 
 using test::hex;
 using test::RpcServed;
@@ -42,31 +39,6 @@ constexpr const char *NoTermChar = "00000000 00000000";
 void expectQuestion(RpcServed &core)
 {
     EXPECT_EQ(takeWrite(core).size, 1u);
-}
-
-/// This process' socket that is connected to @p port.
-int socketTo(std::uint16_t port)
-{
-    int found = -1;
-    DIR *folder = ::opendir("/proc/self/fd");
-    while (const dirent *entry = ::readdir(folder)) {
-        const int descriptor = std::atoi(entry->d_name);
-        sockaddr_in peer{};
-        socklen_t length = sizeof peer;
-        if (::getpeername(descriptor, reinterpret_cast<sockaddr *>(&peer), &length) == 0 &&
-            peer.sin_family == AF_INET && ntohs(peer.sin_port) == port)
-            found = descriptor;
-    }
-    ::closedir(folder);
-    return found;
-}
-
-int option(int descriptor, int level, int name)
-{
-    int value = -1;
-    socklen_t length = sizeof value;
-    EXPECT_EQ(::getsockopt(descriptor, level, name, &value, &length), 0);
-    return value;
 }
 
 } // namespace
@@ -527,20 +499,21 @@ TEST(Vxi11, KeepAliveAndNoDelayReachTheSocket)
 {
     Vxi11Instrument instrument([](RpcServed &core, Vxi11Peer &) { Vxi11Peer::endLink(core); });
     VisaSession &session = instrument.session;
-    const int descriptor = socketTo(instrument.port());
-    ASSERT_GE(descriptor, 0);
+    const std::vector<int> sockets = test::socketsTo(instrument.port());
+    ASSERT_FALSE(sockets.empty());
+    const int descriptor = sockets.back();
     // 7. Firewalls forget a link that is idle for five minutes, so this one shows signs of life from the beginning.
-    EXPECT_EQ(option(descriptor, SOL_SOCKET, SO_KEEPALIVE), 1);
-    EXPECT_LT(option(descriptor, IPPROTO_TCP, TCP_KEEPIDLE), 300);
+    EXPECT_EQ(test::socketOption(descriptor, SOL_SOCKET, SO_KEEPALIVE), 1);
+    EXPECT_LT(test::socketOption(descriptor, IPPROTO_TCP, TCP_KEEPIDLE), 300);
     EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_KEEPALIVE), VI_TRUE);
     EXPECT_EQ(session.set(VI_ATTR_TCPIP_KEEPALIVE, VI_FALSE), VI_SUCCESS);
-    EXPECT_EQ(option(descriptor, SOL_SOCKET, SO_KEEPALIVE), 0);
+    EXPECT_EQ(test::socketOption(descriptor, SOL_SOCKET, SO_KEEPALIVE), 0);
     EXPECT_EQ(session.set(VI_ATTR_TCPIP_KEEPALIVE, VI_TRUE), VI_SUCCESS);
-    EXPECT_EQ(option(descriptor, SOL_SOCKET, SO_KEEPALIVE), 1);
+    EXPECT_EQ(test::socketOption(descriptor, SOL_SOCKET, SO_KEEPALIVE), 1);
     EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_NODELAY), VI_TRUE);
-    EXPECT_NE(option(descriptor, IPPROTO_TCP, TCP_NODELAY), 0);
+    EXPECT_NE(test::socketOption(descriptor, IPPROTO_TCP, TCP_NODELAY), 0);
     EXPECT_EQ(session.set(VI_ATTR_TCPIP_NODELAY, VI_FALSE), VI_SUCCESS);
-    EXPECT_EQ(option(descriptor, IPPROTO_TCP, TCP_NODELAY), 0);
+    EXPECT_EQ(test::socketOption(descriptor, IPPROTO_TCP, TCP_NODELAY), 0);
 }
 
 TEST(Vxi11, IsReachedOverIpv6WhereTheInstrumentListensThere)

@@ -2,6 +2,9 @@
 // port is a recording fake behind the system calls.
 #include "kyvisa/transport/SerialTransport.h"
 
+#include "kyvisa/core/AttributeTable.h"
+#include "kyvisa/core/InstrumentSession.h"
+#include "kyvisa/core/Library.h"
 #include "kyvisa/core/ResourceName.h"
 #include "kyvisa/include/visa.h"
 #include "kyvisa/os/SerialPorts.h"
@@ -277,6 +280,51 @@ TEST_P(SerialAttribute, ReachesTheDriver)
     const LineRow &row = GetParam();
     EXPECT_EQ(set(row.attribute, row.value), VI_SUCCESS);
     EXPECT_TRUE(row.holds(m_driver));
+}
+
+TEST_P(SerialAttribute, OfASessionReachesTheDriver)
+{
+    ResourceName name;
+    ASSERT_EQ(parseResourceName("ASRL/dev/ttyUSB7::INSTR", name), VI_SUCCESS);
+    InstrumentSession session(Library::instance(), name, kind::Serial, VI_NULL);
+    ASSERT_EQ(session.open(1, VI_NO_LOCK, 2000, os::Deadline::never()), VI_SUCCESS);
+    const LineRow &row = GetParam();
+    EXPECT_FALSE(row.holds(m_driver)) << "or the row would show nothing";
+    EXPECT_EQ(session.setAttribute(row.attribute, static_cast<ViAttrState>(row.value)), VI_SUCCESS);
+    EXPECT_TRUE(row.holds(m_driver));
+    EXPECT_EQ(session.close(), VI_SUCCESS);
+}
+
+TEST_F(Serial, EndsAndReplacementOfASessionAreThoseOfItsAttributes)
+{
+    ResourceName name;
+    ASSERT_EQ(parseResourceName("ASRL/dev/ttyUSB7::INSTR", name), VI_SUCCESS);
+    InstrumentSession session(Library::instance(), name, kind::Serial, VI_NULL);
+    ASSERT_EQ(session.open(1, VI_NO_LOCK, 2000, os::Deadline::never()), VI_SUCCESS);
+    const std::string data = "ab";
+    std::size_t count = 0;
+    ASSERT_EQ(session.setAttribute(VI_ATTR_ASRL_END_OUT, VI_ASRL_END_TERMCHAR), VI_SUCCESS);
+    ASSERT_EQ(session.setAttribute(VI_ATTR_TERMCHAR, ';'), VI_SUCCESS);
+    EXPECT_EQ(session.write(std::as_bytes(std::span(data)), count), VI_SUCCESS);
+    EXPECT_EQ(std::exchange(m_driver.output, {}), "ab;");
+    ASSERT_EQ(session.setAttribute(VI_ATTR_SEND_END_EN, VI_FALSE), VI_SUCCESS);
+    EXPECT_EQ(session.write(std::as_bytes(std::span(data)), count), VI_SUCCESS);
+    EXPECT_EQ(std::exchange(m_driver.output, {}), "ab");
+
+    std::string room(8, '\0');
+    const auto read = [&] { return session.read(std::as_writable_bytes(std::span(room)), count); };
+    m_driver.input = "1\n2;3";
+    EXPECT_EQ(read(), VI_SUCCESS) << "END is the termination character";
+    EXPECT_EQ(room.substr(0, count), "1\n2;");
+    ASSERT_EQ(session.setAttribute(VI_ATTR_ASRL_END_IN, VI_ASRL_END_LAST_BIT), VI_SUCCESS);
+    m_driver.input = ";\xC1z";
+    EXPECT_EQ(read(), VI_SUCCESS);
+    EXPECT_EQ(room.substr(0, count), "3;\xC1");
+    ASSERT_EQ(session.setAttribute(VI_ATTR_ASRL_REPLACE_CHAR, '?'), VI_SUCCESS);
+    m_driver.input = std::string("\xFF\0x", 3);
+    EXPECT_EQ(read(), VI_ERROR_ASRL_FRAMING);
+    EXPECT_EQ(room.substr(0, count), "z?");
+    EXPECT_EQ(session.close(), VI_SUCCESS);
 }
 
 INSTANTIATE_TEST_SUITE_P(

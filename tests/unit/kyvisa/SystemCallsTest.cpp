@@ -4,6 +4,7 @@
 #include "kyvisa/core/ResourceName.h"
 #include "kyvisa/include/visa.h"
 #include "kyvisa/os/Connector.h"
+#include "kyvisa/os/ListeningSocket.h"
 #include "kyvisa/os/Resolver.h"
 #include "kyvisa/transport/HislipConnector.h"
 #include "kyvisa/transport/Transport.h"
@@ -160,6 +161,77 @@ TEST(Connector, FailingCallsLeakNothing)
         const ReplacedSystemCalls replaced(calls);
         EXPECT_EQ(connectStream("127.0.0.1", 9, within(20000, nobody), socket), IoResult::NoMemory);
     }
+    EXPECT_EQ(openDescriptors(), before);
+}
+
+/// Datagram sockets find the way that stream sockets have no port left for.
+int connectWithoutPorts(int descriptor, const sockaddr *, socklen_t)
+{
+    int type = 0;
+    socklen_t length = sizeof type;
+    ::getsockopt(descriptor, SOL_SOCKET, SO_TYPE, &type, &length);
+    if (type == SOCK_DGRAM)
+        return 0;
+    failWith(EADDRNOTAVAIL);
+    return -1;
+}
+
+TEST(Connector, TellsThatLocalPortsAreUsedUpFromAnAddressThatIsNotThere)
+{
+    const Wakeup nobody;
+    StreamSocket socket;
+    const std::size_t before = openDescriptors();
+    SystemCalls calls = realSystemCalls();
+    calls.connect = connectWithoutPorts;
+    {
+        const ReplacedSystemCalls replaced(calls);
+        EXPECT_EQ(connectStream("127.0.0.1", 9, within(20000, nobody), socket), IoResult::NoMemory);
+        EXPECT_EQ(connectStream("localhost", 9, within(20000, nobody), socket), IoResult::NoMemory);
+    }
+    calls.connect = [](int, const sockaddr *, socklen_t) { // IPv6 without an address of its own, for one
+        failWith(EADDRNOTAVAIL);
+        return -1;
+    };
+    {
+        const ReplacedSystemCalls replaced(calls);
+        EXPECT_EQ(connectStream("::1", 9, within(20000, nobody), socket), IoResult::NoAddress);
+    }
+    EXPECT_EQ(openDescriptors(), before);
+}
+
+TEST(ListeningSocket, TakesASparePortWhenTheSystemHasNoneToChoose)
+{
+    SystemCalls calls = realSystemCalls();
+    calls.bind = [](int descriptor, const sockaddr *address, socklen_t length) {
+        if (reinterpret_cast<const sockaddr_in *>(address)->sin_port != 0)
+            return ::bind(descriptor, address, length);
+        failWith(EADDRINUSE);
+        return -1;
+    };
+    const ReplacedSystemCalls replaced(calls);
+    ListeningSocket first;
+    ListeningSocket second;
+    ASSERT_TRUE(first.open(INADDR_LOOPBACK));
+    ASSERT_TRUE(second.open(INADDR_LOOPBACK));
+    EXPECT_GE(first.port(), 61000);
+    EXPECT_NE(first.port(), second.port());
+    const Wakeup nobody;
+    StreamSocket client;
+    EXPECT_EQ(connectStream("127.0.0.1", second.port(), within(20000, nobody), client), IoResult::Done);
+    EXPECT_TRUE(second.accept().isOpen());
+}
+
+TEST(ListeningSocket, SaysSoWhenNoPortIsLeftAtAll)
+{
+    const std::size_t before = openDescriptors();
+    SystemCalls calls = realSystemCalls();
+    calls.bind = [](int, const sockaddr *, socklen_t) {
+        failWith(EADDRINUSE);
+        return -1;
+    };
+    const ReplacedSystemCalls replaced(calls);
+    ListeningSocket listener;
+    EXPECT_FALSE(listener.open(INADDR_LOOPBACK));
     EXPECT_EQ(openDescriptors(), before);
 }
 
