@@ -210,13 +210,12 @@ bool Vxi11Session::unlock(xdr::Reader &arguments)
     vxi11::Link call;
     if (!vxi11::decode(arguments, call))
         return false;
-    const Vxi11Link *link = ownLink(call.link);
+    Vxi11Link *link = ownLink(call.link);
     if (!link)
-        finish(Error::InvalidLink);
-    else if (link->target->locks().release(link->lockOwner) == LockTable::Released::Nothing)
-        finish(Error::NoLockHeld);
-    else
-        finish(Error::NoError);
+        return finish(Error::InvalidLink), true;
+    const LockTable::Released released = link->target->locks().release(link->lockOwner);
+    m_pending->link = link; // not before: those who waited for the lock look at what is pending
+    finish(released == LockTable::Released::Nothing ? Error::NoLockHeld : Error::NoError);
     return true;
 }
 
@@ -230,6 +229,7 @@ bool Vxi11Session::enableSrq(xdr::Reader &arguments)
         return finish(Error::InvalidLink), true;
     link->serviceRequests = call.enable;
     link->handle.assign(call.handle.begin(), call.handle.end());
+    m_pending->link = link;
     finish(Error::NoError);
     return true;
 }

@@ -157,7 +157,14 @@ def rule(way, fault, operation):
 
 #: (way, fault, operation) -> status, number of its reason
 EXCEPTIONS = {}
-REASONS = {}
+REASONS = {
+    1: "Formatted operations know a time-out and everything else (VPP-4.3): a connection that is lost is IO to them.",
+}
+for each in WAYS:
+    for what in FAULTS:
+        for formatted in ("printf", "scanf", "queryf"):
+            if rule(each, what, formatted) == "CONN_LOST":
+                EXCEPTIONS[each, what, formatted] = ("IO", 1)
 
 BEGIN = "<!-- tables -->\n"
 

@@ -199,3 +199,13 @@ TEST_F(GpibSrqFault, RepeatSrqSaysItAgain)
     request(controller);
     nextClient();
 }
+
+TEST_F(GpibFault, OnAllStrikesEveryReplyOfItsLinks)
+{
+    add("gpib:stale-id:on=all");
+    client.core.send("00000013", client.link); // device_unlock
+    EXPECT_EQ(received(32), "8000001C 11223343 00000001 00000000 00000000 00000000 00000000 0000000C ");
+    client.core.send("00000014", client.link + "00000001 00000000"); // device_enable_srq
+    EXPECT_EQ(received(32), "8000001C 11223343 00000001 00000000 00000000 00000000 00000000 00000000 ");
+    client.core.client().close();
+}
