@@ -1,4 +1,5 @@
 // The library as a guest in a process: fork, dlopen under two names, no threads and no output of its own.
+#include "support/ClosedPort.h"
 #include "support/HislipPeer.h"
 #include "support/QuietFork.h"
 #include "support/VisaSession.h"
@@ -15,6 +16,7 @@
 #include <unistd.h>
 
 using test::acceptHislip;
+using test::ClosedPort;
 using test::hex;
 using test::HislipConnections;
 using test::ScriptedPeer;
@@ -120,11 +122,7 @@ TEST(Process, StartsNoThreadAndKeepsNoDescriptorForAResourceManager)
 
 TEST(Process, OpensThatFailKeepNothing)
 {
-    std::uint16_t refused = 0;
-    {
-        const ScriptedPeer peer([](ScriptedPeer &) {});
-        refused = peer.port();
-    }
+    const ClosedPort closed;
     ScriptedPeer peer([](ScriptedPeer &self) {
         for (int i = 0; i < 150; ++i)
             self.accept().close();
@@ -132,7 +130,8 @@ TEST(Process, OpensThatFailKeepNothing)
     VisaSession session;
     const std::size_t descriptors = entries("/proc/self/fd");
     for (int i = 0; i < 150; ++i) {
-        EXPECT_EQ(session.open("TCPIP::127.0.0.1::" + std::to_string(refused) + "::SOCKET"), VI_ERROR_RSRC_NFOUND);
+        EXPECT_EQ(session.open("TCPIP::127.0.0.1::" + std::to_string(closed.number()) + "::SOCKET"),
+                  VI_ERROR_RSRC_NFOUND);
         EXPECT_EQ(session.open(resource(peer)), VI_ERROR_RSRC_NFOUND);
     }
     peer.finish();

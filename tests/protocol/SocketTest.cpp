@@ -1,4 +1,5 @@
 // Raw sockets: what the instrument says, and the exact bytes that the library must have sent.
+#include "support/ClosedPort.h"
 #include "support/ScriptedPeer.h"
 #include "support/Stopwatch.h"
 #include "support/VisaSession.h"
@@ -8,6 +9,7 @@
 #include <gtest/gtest.h>
 #include <thread>
 
+using test::ClosedPort;
 using test::PeerConnection;
 using test::ScriptedPeer;
 using test::Stopwatch;
@@ -468,14 +470,11 @@ TEST(Socket, OpensByNameOnWhicheverFamilyTheInstrumentListens)
 
 TEST(Socket, OpeningWhereNobodyListensFailsAtOnce)
 {
-    std::uint16_t port;
-    {
-        ScriptedPeer peer([](ScriptedPeer &) {});
-        port = peer.port();
-    }
+    const ClosedPort closed;
     VisaSession session;
     const Stopwatch watch;
-    EXPECT_EQ(session.open("TCPIP::localhost::" + std::to_string(port) + "::SOCKET", 30000), VI_ERROR_RSRC_NFOUND);
+    EXPECT_EQ(session.open("TCPIP::localhost::" + std::to_string(closed.number()) + "::SOCKET", 30000),
+              VI_ERROR_RSRC_NFOUND);
     EXPECT_LT(watch.milliseconds(), 10000);
     EXPECT_EQ(session.vi, VI_NULL);
 }

@@ -1,6 +1,7 @@
 // Registering with a portmapper that runs already: what it is told, and what it may answer.
 #include "simulator/server/PortmapRegistration.h"
 
+#include "support/ClosedPort.h"
 #include "support/ScriptedPeer.h"
 
 #include <gtest/gtest.h>
@@ -68,14 +69,10 @@ TEST(PortmapRegistration, LeavesAlonePortsThatSomebodyServes)
 
 TEST(PortmapRegistration, TakesThePlaceOfOneThatWasLeftBehind)
 {
-    std::uint16_t closed = 0;
-    {
-        ScriptedPeer nobody([](ScriptedPeer &) {});
-        closed = nobody.port();
-    }
-    ScriptedPeer portmapper([=](ScriptedPeer &self) {
+    const ClosedPort closed;
+    ScriptedPeer portmapper([&](ScriptedPeer &self) {
         answer(self, Set, No);
-        const std::string number{static_cast<char>(closed >> 8), static_cast<char>(closed & 0xFF)};
+        const std::string number{static_cast<char>(closed.number() >> 8), static_cast<char>(closed.number() & 0xFF)};
         answer(self, GetPort, reply("0000") + number);
         answer(self, Unset, Yes);
         answer(self, Set, Yes);
@@ -97,12 +94,8 @@ TEST(PortmapRegistration, IsRefusedByOneThatRegistersNobody)
 
 TEST(PortmapRegistration, FindsNobody)
 {
-    std::uint16_t closed = 0;
-    {
-        ScriptedPeer nobody([](ScriptedPeer &) {});
-        closed = nobody.port();
-    }
-    PortmapRegistration registration(closed);
+    const ClosedPort closed;
+    PortmapRegistration registration(closed.number());
     EXPECT_EQ(registration.add(Core), Outcome::Nobody);
 }
 

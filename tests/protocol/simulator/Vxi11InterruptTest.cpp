@@ -1,5 +1,6 @@
 // Service requests of VXI-11: the instrument connects back, and tells without waiting for an answer.
 #include "protocol/simulator/Vxi11Client.h"
+#include "support/ClosedPort.h"
 #include "support/ScriptedPeer.h"
 
 #include <gtest/gtest.h>
@@ -114,12 +115,8 @@ TEST_F(Vxi11Interrupt, ConnectsBackToTheCallerAlone)
     EXPECT_EQ(client.core.call("00000019", "7F000001 00009C40 000607B1 00000001 00000001"), "00000008 ") << "UDP";
     EXPECT_EQ(client.core.call("00000019", "7F000001 00000000 000607B1 00000001 00000000"), "00000005 ") << "port 0";
     EXPECT_EQ(client.core.call("00000019", "7F000001 00010000 000607B1 00000001 00000000"), "00000005 ");
-    std::uint16_t closed = 0;
-    {
-        ScriptedPeer nobody([](ScriptedPeer &) {});
-        closed = nobody.port();
-    }
-    EXPECT_EQ(create(closed), "00000006 ") << "nobody listens";
+    const ClosedPort closed;
+    EXPECT_EQ(create(closed.number()), "00000006 ") << "nobody listens";
     EXPECT_EQ(client.core.call("0000001A"), "00000006 ");
     EXPECT_EQ(client.query("*OPC?\n"), "1\n");
 }
