@@ -53,6 +53,13 @@ public:
             m_stopwatch.start();
     }
 
+    /// For the call that may switch the trace on: what it has taken is known all the same.
+    Call &timed()
+    {
+        m_stopwatch.start();
+        return *this;
+    }
+
     template <typename Work>
     ViStatus on(ViObject handle, const Work &work) const noexcept
     {

@@ -6,7 +6,7 @@ using namespace kyvisa::api;
 
 ViStatus viOpenDefaultRM(ViPSession sesn)
 {
-    return Call("viOpenDefaultRM", Out{sesn}).anywhere([&]() -> ViStatus {
+    return Call("viOpenDefaultRM", Out{sesn}).timed().anywhere([&]() -> ViStatus {
         if (!sesn)
             return VI_ERROR_INV_PARAMETER;
         *sesn = VI_NULL;

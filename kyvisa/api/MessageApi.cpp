@@ -113,10 +113,13 @@ ViStatus viAssertTrigger(ViSession vi, ViUInt16 protocol)
 ViStatus viReadSTB(ViSession vi, ViPUInt16 status)
 {
     storeIfWanted<ViUInt16>(status, 0);
-    return Call("viReadSTB", vi, Out{status}).onInstrument(vi, [&](InstrumentSession &session) {
+    return Call("viReadSTB", vi, Out{status}).onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
+        // A serial poll takes the request for service away: not for nobody.
+        if (!status)
+            return VI_ERROR_INV_PARAMETER;
         ViUInt16 byte = 0;
         const ViStatus result = session.readStatusByte(byte);
-        storeIfWanted(status, byte);
+        *status = byte;
         return result;
     });
 }

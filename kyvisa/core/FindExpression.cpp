@@ -54,6 +54,8 @@ std::optional<AttributeCondition::Value> valueOf(const AttributeStore &attribute
 
 std::optional<FindExpression> FindExpression::parse(std::string_view text)
 {
+    if (text.size() > LongestExpression)
+        return std::nullopt;
     TextReader patternReader(text);
     auto pattern = ResourcePattern::parse(patternReader);
     if (!pattern)

@@ -3,11 +3,15 @@
 #include "kyvisa/core/AttributeCondition.h"
 #include "kyvisa/core/ResourcePattern.h"
 
+#include <cstddef>
 #include <optional>
 #include <string_view>
 
 namespace kyvisa
 {
+
+/// Bytes of an expression. Working it out takes time and stack in proportion, and nobody types as much.
+constexpr std::size_t LongestExpression = 4096;
 
 /**
  * The search expression of viFindRsrc: a regular expression over resource strings, optionally followed by an attribute
@@ -16,7 +20,7 @@ namespace kyvisa
 class FindExpression
 {
 public:
-    /// Nothing when @p text is not valid.
+    /// Nothing when @p text is not valid, or too long.
     static std::optional<FindExpression> parse(std::string_view text);
 
     /// @param resource a canonical resource string.

@@ -72,7 +72,8 @@ std::optional<std::vector<std::string_view>> split(std::string_view text)
         }
         const std::size_t end = text.find("::", from);
         parts.push_back(text.substr(0, end));
-        if (parts.back().empty())
+        // A colon at an end of a part could not be told from those between the parts.
+        if (parts.back().empty() || parts.back().front() == ':' || parts.back().back() == ':')
             return std::nullopt;
         if (end == text.npos)
             return parts;

@@ -11,6 +11,7 @@ namespace
 
 constexpr std::size_t MostResources = 64;
 constexpr std::size_t MostDepth = 64;
+constexpr std::size_t LongestEntity = 16; ///< with its "&" and ";"; what is longer is text
 
 void appendUtf8(std::string &text, std::uint32_t code)
 {
@@ -62,7 +63,7 @@ std::string plainText(std::string_view raw)
         const std::size_t ampersand = std::min(raw.find('&'), raw.size());
         text += raw.substr(0, ampersand);
         raw.remove_prefix(ampersand);
-        const std::size_t semicolon = raw.find(';');
+        const std::size_t semicolon = raw.substr(0, LongestEntity).find(';');
         if (raw.empty())
             break;
         if (semicolon != raw.npos && appendEntity(text, raw.substr(1, semicolon - 1))) {

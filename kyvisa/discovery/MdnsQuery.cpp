@@ -104,6 +104,9 @@ void MdnsQuery::note(const Record &record, Heard &heard)
         if (type != std::end(Types))
             keep(heard.instances, keyOf(pointer->target), Instance{type->second, pointer->target});
     } else if (const auto *service = std::get_if<Service>(&record.data)) {
+        // Port 0 says that the service is not there (RFC 6763 section 8: its name alone is taken).
+        if (service->port == 0)
+            return;
         keep(heard.services, keyOf(record.name), *service);
     } else if (const auto *text = std::get_if<Text>(&record.data)) {
         keep(heard.texts, keyOf(record.name), *text);

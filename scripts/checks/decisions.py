@@ -1,7 +1,8 @@
 #!/usr/bin/env python3
-"""Checks that every page in docs/decisions/ names a test that exists.
+"""Checks that every page in docs/decisions/ names a test that exists, and that those which docs/operations.md names do.
 
-A page carries one or more lines `Test: NAME`, with NAME as ctest lists it. Usage: decisions.py BUILD_FOLDER [ROOT].
+A page carries one or more lines `Test: NAME`, with NAME as ctest lists it. A table row of operations.md ends with `NAME` or nothing, where
+NAME may leave out what stands around the slashes of a parameterised test. Usage: decisions.py BUILD_FOLDER [ROOT].
 """
 import pathlib
 import re
@@ -21,6 +22,12 @@ for page in pages:
     if not named:
         findings.append(f"{page.name}: names no test")
     findings += [f"{page.name}: there is no test {name}" for name in named if name not in tests]
+
+parts = {part for test in tests for part in test.split("/")}
+rows = re.findall(r"^\| `vi.*\| +(?:`(\S+)` )?\|$", (ROOT / "docs" / "operations.md").read_text(encoding="utf-8"), re.M)
+findings += [f"operations.md: there is no test {name}" for name in rows if name and name not in tests | parts]
+if not rows:
+    findings.append("operations.md: no rows")
 
 print("\n".join(findings) if findings else f"{len(pages)} decisions, each with its test")
 sys.exit(1 if findings else 0)

@@ -20,6 +20,12 @@ constexpr std::array<BusAddress, 2> MoreInstruments{{{7, std::nullopt}, {9, 1}}}
 constexpr BusAddress Plotter{12, std::nullopt};
 constexpr std::uint64_t MostFiles = std::uint64_t{64} << 20;
 
+/// An instrument without a secondary address takes no notice of one: every link to its primary address leads to it.
+bool leadsTo(const BusAddress &instrument, const BusAddress &link)
+{
+    return link.primary == instrument.primary && (!instrument.secondary || link.secondary == instrument.secondary);
+}
+
 /// The make of the main instrument, with a serial number of its own and memory for small files.
 InstrumentOptions next(InstrumentOptions options, std::size_t number)
 {
@@ -52,11 +58,15 @@ void Vxi11Gateway::addInstrument(BusAddress address, Instrument &instrument)
         m_events.changed();
     };
     const auto isAwaited = [this, address] {
-        return m_events.isAwaited(targetAt(address)) ||
+        return std::any_of(
+                   m_addresses.begin(), m_addresses.end(),
+                   [&](const auto &link) { return leadsTo(address, link.first) && m_events.isAwaited(link.second); }) ||
                (m_bus.talker() && m_bus.talker()->address() == address && m_events.isAwaited(m_interface));
     };
     const auto serviceRequest = [this, address] {
-        m_events.serviceRequest(targetAt(address));
+        for (const auto &[link, target] : m_addresses)
+            if (leadsTo(address, link))
+                m_events.serviceRequest(target);
         m_events.serviceRequest(m_interface);
     };
     m_bus.add(

@@ -74,6 +74,13 @@ TEST(LxiDocument, LeavesUnknownEntitiesAsTheyStand)
     EXPECT_EQ(document->texts.model, "&nbsp;&#0;&#xZ;&");
 }
 
+TEST(LxiDocument, LeavesEntitiesThatAreTooLongAsTheyStand)
+{
+    const auto document = readLxiDocument("<LXIDevice><Model>&#x0010FFFF;&#00000000000000000065;</Model></LXIDevice>");
+    ASSERT_TRUE(document.has_value());
+    EXPECT_EQ(document->texts.model, "\xF4\x8F\xBF\xBF&#00000000000000000065;");
+}
+
 TEST(LxiDocument, RefusesEverythingElse)
 {
     for (const char *text :

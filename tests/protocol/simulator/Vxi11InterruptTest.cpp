@@ -178,3 +178,23 @@ TEST_F(GatewayInterrupt, TellsTheLinksOfTheInstrumentThatRequestsServiceAndThose
     for (Vxi11Client *client : {&second, &other, &bus})
         EXPECT_EQ(client->core.call("0000001A"), "00000000 ");
 }
+
+TEST_F(GatewayInterrupt, TellsLinksThatNameASecondaryAddressWhichTheInstrumentDoesNotHave)
+{
+    Vxi11Client second(port, "gpib0,7,0");
+    std::promise<void> seen;
+    ScriptedPeer controller([&](ScriptedPeer &self) {
+        PeerConnection channel = self.accept();
+        channel.expect(hex("80000030 00000001") + hex(Header) + hex("00000002") + "s7" + std::string(2, '\0'));
+        seen.set_value();
+        channel.expectClosed();
+    });
+    ASSERT_EQ(second.core.call("00000019", "7F000001" + RpcCaller::digits(RpcCaller::word(controller.port())) +
+                                               "000607B1 00000001 00000000"),
+              "00000000 ");
+    ASSERT_EQ(enable(second, "s7"), "00000000 ");
+    second.write("*SRE 16\n");
+    second.write("*IDN?\n");
+    EXPECT_EQ(seen.get_future().wait_for(std::chrono::seconds(30)), std::future_status::ready);
+    EXPECT_EQ(second.core.call("0000001A"), "00000000 ");
+}
