@@ -37,14 +37,12 @@ ViStatus viRead(ViSession vi, ViPBuf buf, ViUInt32 cnt, ViPUInt32 retCnt)
 
 ViStatus viReadAsync(ViSession vi, ViPBuf buf, ViUInt32 cnt, ViPJobId jobId)
 {
+    storeIfWanted<ViJobId>(jobId, VI_NULL);
     return Call("viReadAsync", vi, Address{buf}, cnt, Out{jobId})
         .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
             if (!buf && cnt > 0)
                 return VI_ERROR_USER_BUF;
-            ViJobId job = VI_NULL;
-            const ViStatus status = session.readAsync(bytes(buf, cnt), job);
-            storeIfWanted(jobId, job);
-            return status;
+            return session.readAsync(bytes(buf, cnt), jobId);
         });
 }
 
@@ -78,14 +76,12 @@ ViStatus viWrite(ViSession vi, ViConstBuf buf, ViUInt32 cnt, ViPUInt32 retCnt)
 
 ViStatus viWriteAsync(ViSession vi, ViConstBuf buf, ViUInt32 cnt, ViPJobId jobId)
 {
+    storeIfWanted<ViJobId>(jobId, VI_NULL);
     return Call("viWriteAsync", vi, Bytes{buf, cnt}, cnt, Out{jobId})
         .onInstrument(vi, [&](InstrumentSession &session) -> ViStatus {
             if (!buf && cnt > 0)
                 return VI_ERROR_USER_BUF;
-            ViJobId job = VI_NULL;
-            const ViStatus status = session.writeAsync(bytes(buf, cnt), job);
-            storeIfWanted(jobId, job);
-            return status;
+            return session.writeAsync(bytes(buf, cnt), jobId);
         });
 }
 

@@ -5,7 +5,6 @@
 #include "kyvisa/os/Thread.h"
 
 #include <algorithm>
-#include <chrono>
 #include <system_error>
 
 namespace kyvisa
@@ -14,7 +13,8 @@ namespace
 {
 
 constexpr ViUInt16 CallbackModes = VI_HNDLR | VI_SUSPEND_HNDLR;
-constexpr std::chrono::seconds PatienceWithHandlers{5};
+/// Of events on their way to a handler.
+constexpr std::size_t MostForHandlers = 4096;
 
 bool validToEnable(ViUInt16 mechanism)
 {
@@ -39,7 +39,7 @@ bool matches(ViEventType wanted, ViEventType type)
 
 } // namespace
 
-EventHub::EventHub(std::span<const ViEventType> types, Contexts contexts) : m_contexts(std::move(contexts))
+EventHub::EventHub(std::span<const ViEventType> types, Contexts contexts) : m_handlers(std::move(contexts))
 {
     for (const ViEventType type : types.first(std::min(types.size(), m_states.size())))
         m_states[m_stateCount++].type = type;
@@ -72,7 +72,7 @@ ViStatus EventHub::enableOne(TypeState &state, ViUInt16 mechanism, std::vector<E
 {
     if (state.type == VI_EVENT_EXCEPTION && mechanism != VI_HNDLR)
         return VI_ERROR_NSUP_MECH;
-    if ((mechanism & VI_HNDLR) != 0 && state.handlers.empty())
+    if ((mechanism & VI_HNDLR) != 0 && !m_handlers.any(state.type))
         return VI_ERROR_HNDLR_NINSTALLED;
     if ((mechanism & VI_HNDLR) != 0 && state.type != VI_EVENT_EXCEPTION && !startHandlerThread())
         return VI_ERROR_ALLOC;
@@ -81,6 +81,8 @@ ViStatus EventHub::enableOne(TypeState &state, ViUInt16 mechanism, std::vector<E
     if ((mechanism & CallbackModes) != 0)
         state.mechanisms &= static_cast<ViUInt16>(~CallbackModes);
     state.mechanisms |= mechanism;
+    if ((mechanism & VI_SUSPEND_HNDLR) != 0)
+        suspend(state.type);
     m_everEnabled = true;
     if ((mechanism & VI_HNDLR) != 0) {
         std::copy_if(m_suspended.begin(), m_suspended.end(), std::back_inserter(pending),
@@ -90,34 +92,67 @@ ViStatus EventHub::enableOne(TypeState &state, ViUInt16 mechanism, std::vector<E
     return already ? VI_SUCCESS_EVENT_EN : VI_SUCCESS;
 }
 
+/// What has not reached a handler yet waits until handlers are enabled again.
+void EventHub::suspend(ViEventType type)
+{
+    const auto ofType = [type](const Event &event) { return event.type == type; };
+    for (const Event &event : m_forHandlers)
+        if (ofType(event))
+            append(m_suspended, event, m_queueLength);
+    std::erase_if(m_forHandlers, ofType);
+}
+
 ViStatus EventHub::enable(ViEventType type, ViUInt16 mechanism, ViEventFilter filter)
 {
+    std::unique_lock lock(m_mutex);
+    TypeState *only = stateOf(type);
+    if (!only && type != VI_ALL_ENABLED_EVENTS)
+        return VI_ERROR_INV_EVENT;
+    if (!validToEnable(mechanism))
+        return VI_ERROR_INV_MECH;
+    if (filter != 0)
+        return VI_ERROR_INV_CONTEXT;
     std::vector<Event> pending;
     ViStatus status = VI_SUCCESS;
-    {
-        const std::lock_guard lock(m_mutex);
-        TypeState *only = stateOf(type);
-        if (!only && type != VI_ALL_ENABLED_EVENTS)
-            return VI_ERROR_INV_EVENT;
-        if (!validToEnable(mechanism))
-            return VI_ERROR_INV_MECH;
-        if (filter != 0)
-            return VI_ERROR_INV_CONTEXT;
-        for (TypeState &state : states()) {
-            const bool chosen = only ? &state == only : state.mechanisms != 0 && state.type != VI_EVENT_EXCEPTION;
-            if (!chosen)
-                continue;
-            const ViStatus one = enableOne(state, mechanism, pending);
-            if (one < VI_SUCCESS || status == VI_SUCCESS)
-                status = one;
-            if (one < VI_SUCCESS)
-                break;
-        }
+    for (TypeState &state : states()) {
+        const bool chosen = only ? &state == only : state.mechanisms != 0 && state.type != VI_EVENT_EXCEPTION;
+        if (!chosen)
+            continue;
+        const ViStatus one = enableOne(state, mechanism, pending);
+        if (one < VI_SUCCESS || status == VI_SUCCESS)
+            status = one;
+        if (one < VI_SUCCESS)
+            break;
     }
-    // Those that waited while the handlers were suspended reach them before this call returns.
-    for (const Event &event : pending)
-        callHandlers(event);
+    if (!pending.empty())
+        handOver(lock, pending);
     return status;
+}
+
+/// Those that waited while the handlers were suspended reach them before the call returns, and before any newer one.
+void EventHub::handOver(std::unique_lock<std::mutex> &lock, const std::vector<Event> &pending)
+{
+    const bool inHandler = m_handingOver && m_handsOver == std::this_thread::get_id();
+    bool mine = false;
+    if (!inHandler) {
+        ++m_pendingFirst;
+        mine = os::waitUntil(m_changed, lock, os::Deadline::after(EventHandlers::Patience),
+                             [this] { return !m_handingOver || m_closed; });
+        --m_pendingFirst;
+        if (m_closed)
+            return;
+    }
+    if (mine) {
+        m_handingOver = true;
+        m_handsOver = std::this_thread::get_id();
+    }
+    lock.unlock();
+    for (const Event &event : pending)
+        m_handlers.call(event);
+    lock.lock();
+    if (mine)
+        m_handingOver = false;
+    m_changed.notify_all();
 }
 
 ViStatus EventHub::disable(ViEventType type, ViUInt16 mechanism)
@@ -146,6 +181,8 @@ ViStatus EventHub::disable(ViEventType type, ViUInt16 mechanism)
         else
             someWereOff |= only && ((queueAsked && queueOff) || (callbackAsked && callbackOff));
         state.mechanisms &= static_cast<ViUInt16>(~ended);
+        if (callbackAsked)
+            suspend(state.type);
     }
     m_changed.notify_all();
     return someWereOff ? VI_SUCCESS_EVENT_DIS : VI_SUCCESS;
@@ -221,39 +258,32 @@ ViStatus EventHub::wait(ViEventType type, ViUInt32 timeout, Event &event)
 
 ViStatus EventHub::install(ViEventType type, ViHndlr handler, ViAddr userHandle)
 {
-    const std::lock_guard lock(m_mutex);
-    TypeState *state = stateOf(type);
-    if (!state)
-        return VI_ERROR_INV_EVENT;
-    if (!handler)
-        return VI_ERROR_INV_HNDLR_REF;
-    state->handlers.push_back({handler, userHandle});
-    return VI_SUCCESS;
+    return possible(type) ? m_handlers.install(type, handler, userHandle) : VI_ERROR_INV_EVENT;
 }
 
 ViStatus EventHub::uninstall(ViEventType type, ViHndlr handler, ViAddr userHandle)
 {
-    const std::lock_guard lock(m_mutex);
-    TypeState *state = stateOf(type);
-    if (!state)
-        return VI_ERROR_INV_EVENT;
-    if (state->handlers.empty())
-        return VI_ERROR_HNDLR_NINSTALLED;
-    const std::size_t removed = std::erase_if(state->handlers, [&](const Handler &installed) {
-        return installed.userHandle == userHandle && (!handler || installed.function == handler);
-    });
-    if (removed == 0)
-        return VI_ERROR_INV_HNDLR_REF;
-    if (state->handlers.empty())
-        state->mechanisms &= static_cast<ViUInt16>(~CallbackModes);
+    {
+        const std::lock_guard lock(m_mutex);
+        TypeState *state = stateOf(type);
+        if (!state)
+            return VI_ERROR_INV_EVENT;
+        if (const ViStatus status = m_handlers.uninstall(type, handler, userHandle); status != VI_SUCCESS)
+            return status;
+        if (!m_handlers.any(type)) {
+            state->mechanisms &= static_cast<ViUInt16>(~CallbackModes);
+            suspend(type);
+        }
+    }
+    m_handlers.awaitReturn(type, handler, userHandle);
     return VI_SUCCESS;
 }
 
-bool EventHub::append(Queue &queue, const Event &event)
+bool EventHub::append(Queue &queue, const Event &event, std::size_t most)
 {
     const auto sameType =
         std::count_if(queue.begin(), queue.end(), [&](const Event &queued) { return queued.type == event.type; });
-    if (static_cast<ViUInt64>(sameType) >= m_queueLength)
+    if (static_cast<std::size_t>(sameType) >= most)
         return false;
     queue.push_back(event);
     return true;
@@ -265,12 +295,12 @@ void EventHub::post(const Event &event)
     TypeState *state = stateOf(event.type);
     if (!state || m_closed)
         return;
-    if ((state->mechanisms & VI_QUEUE) != 0 && !append(m_queue, event))
+    if ((state->mechanisms & VI_QUEUE) != 0 && !append(m_queue, event, m_queueLength))
         state->overflowed = true;
     if ((state->mechanisms & VI_HNDLR) != 0)
-        append(m_forHandlers, event);
+        append(m_forHandlers, event, MostForHandlers);
     if ((state->mechanisms & VI_SUSPEND_HNDLR) != 0)
-        append(m_suspended, event);
+        append(m_suspended, event, m_queueLength);
     m_changed.notify_all();
 }
 
@@ -282,7 +312,8 @@ void EventHub::raiseException(const Event &event)
         if (m_closed || !state || (state->mechanisms & VI_HNDLR) == 0)
             return;
     }
-    callHandlers(event);
+    if (!m_handlers.runningHere(VI_EVENT_EXCEPTION))
+        m_handlers.call(event);
 }
 
 bool EventHub::startHandlerThread()
@@ -301,41 +332,21 @@ bool EventHub::startHandlerThread()
 void EventHub::runHandlers()
 {
     std::unique_lock lock(m_mutex);
-    m_handlerThread = std::this_thread::get_id();
     for (;;) {
-        m_changed.wait(lock, [this] { return m_closed || !m_forHandlers.empty(); });
+        m_changed.wait(
+            lock, [this] { return m_closed || (!m_forHandlers.empty() && !m_handingOver && m_pendingFirst == 0); });
         if (m_closed)
             return;
         const Event event = m_forHandlers.front();
         m_forHandlers.pop_front();
-        m_handlerRunning = true;
+        m_handingOver = true;
+        m_handsOver = std::this_thread::get_id();
         lock.unlock();
-        try {
-            callHandlers(event);
-        } catch (...) {
-            // Out of memory, or a handler that let an exception out: the event is lost, the program goes on.
-        }
+        m_handlers.call(event);
         lock.lock();
-        m_handlerRunning = false;
+        m_handingOver = false;
         m_changed.notify_all();
     }
-}
-
-void EventHub::callHandlers(const Event &event)
-{
-    std::vector<Handler> handlers;
-    {
-        const std::lock_guard lock(m_mutex);
-        if (const TypeState *state = stateOf(event.type))
-            handlers = state->handlers;
-    }
-    const ViEvent context = m_contexts.make(event);
-    if (context == 0)
-        return;
-    for (auto handler = handlers.rbegin(); handler != handlers.rend(); ++handler)
-        if (handler->function(m_session, event.type, context, handler->userHandle) == VI_SUCCESS_NCHAIN)
-            break;
-    m_contexts.close(context);
 }
 
 void EventHub::terminate()
@@ -347,14 +358,15 @@ void EventHub::terminate()
 
 void EventHub::close()
 {
-    std::unique_lock lock(m_mutex);
-    m_closed = true;
-    m_queue.clear();
-    m_suspended.clear();
-    m_forHandlers.clear();
-    m_changed.notify_all();
-    if (m_handlerThread != std::this_thread::get_id())
-        os::waitUntil(m_changed, lock, os::Deadline::after(PatienceWithHandlers), [this] { return !m_handlerRunning; });
+    {
+        const std::lock_guard lock(m_mutex);
+        m_closed = true;
+        m_queue.clear();
+        m_suspended.clear();
+        m_forHandlers.clear();
+        m_changed.notify_all();
+    }
+    m_handlers.close();
 }
 
 } // namespace kyvisa

@@ -62,6 +62,7 @@ ViStatus FormattedIo::inTurn(const Work &work)
     case IoGate::Entered::TimedOut:
         return VI_ERROR_TMO;
     case IoGate::Entered::Closed:
+    case IoGate::Entered::Cancelled:
         return VI_ERROR_INV_OBJECT;
     case IoGate::Entered::Yes:
         break;

@@ -47,7 +47,16 @@ InstrumentSession::InstrumentSession(Library &library, const ResourceName &name,
                   return inTurn(enterBy, CallWatch(m_interruptions),
                                 [&](const os::WaitLimit &limit) { return call(*m_transport, limit.wakeup); });
               }),
-      m_events(std::make_shared<EventHub>(possibleEvents(sessionKind), contextsIn(library, resourceManager)))
+      m_events(std::make_shared<EventHub>(possibleEvents(sessionKind), contextsIn(library, resourceManager))),
+      m_jobs(
+          m_gate, m_wakeup,
+          [this](const AsyncTransfers::Job &job, const std::atomic<bool> &cancelled, std::size_t &count) {
+              return carryOut(job, cancelled, count);
+          },
+          [this](const Event &event) {
+              if (!m_interruptions.closing.load())
+                  m_events->post(event);
+          })
 {
     describeResource(name, m_attributes);
     m_attributes.setNumber(VI_ATTR_RM_SESSION, resourceManager);
@@ -94,13 +103,16 @@ ViStatus InstrumentSession::mayTransfer()
     return m_locks.shutOut() ? VI_ERROR_RSRC_LOCKED : VI_SUCCESS;
 }
 
-ViStatus InstrumentSession::enterGate(os::Deadline deadline, const CallWatch &watch)
+/// What came of waiting for the turn. With VI_SUCCESS it is the caller's, and the wake-up is armed.
+ViStatus InstrumentSession::entered(IoGate::Entered entered, const CallWatch &watch)
 {
-    switch (m_gate.enter(deadline)) {
+    switch (entered) {
     case IoGate::Entered::TimedOut:
         return VI_ERROR_TMO;
     case IoGate::Entered::Closed:
         return VI_ERROR_INV_OBJECT;
+    case IoGate::Entered::Cancelled:
+        return VI_ERROR_ABORT;
     case IoGate::Entered::Yes:
         break;
     }
@@ -129,9 +141,8 @@ ViStatus InstrumentSession::perform(os::Deadline deadline, const Operation &oper
 template <typename Operation>
 ViStatus InstrumentSession::inTurn(os::Deadline deadline, const CallWatch &watch, const Operation &operation)
 {
-    const ViStatus entered = enterGate(deadline, watch);
-    if (entered != VI_SUCCESS)
-        return entered;
+    if (const ViStatus status = entered(m_gate.enter(deadline), watch); status != VI_SUCCESS)
+        return status;
     const GateTurn turn(m_gate);
     return operation({deadline, m_wakeup});
 }
@@ -169,34 +180,52 @@ ViStatus InstrumentSession::write(std::span<const std::byte> data, std::size_t &
 ViStatus InstrumentSession::write(std::span<const std::byte> data, std::size_t &count, os::Deadline deadline, bool end)
 {
     count = 0;
-    return perform(deadline, [&](const os::WaitLimit &limit) {
-        TransferMode mode = transferMode();
-        mode.sendEnd = mode.sendEnd && end;
-        return data.empty() ? VI_SUCCESS : m_transport->write(data, mode, limit, count);
-    });
+    return perform(deadline, [&](const os::WaitLimit &limit) { return transfer(data, end, limit, count); });
 }
 
-ViStatus InstrumentSession::readAsync(std::span<std::byte> buffer, ViJobId &job)
+ViStatus InstrumentSession::transfer(std::span<const std::byte> data, bool end, const os::WaitLimit &limit,
+                                     std::size_t &count)
 {
-    job = ++m_lastJob;
-    Event done{.type = VI_EVENT_IO_COMPLETION, .operation = "viReadAsync", .job = job, .buffer = buffer.data()};
-    std::size_t count = 0;
-    done.status = read(buffer, count);
-    done.count = count;
-    m_events->post(done);
-    return VI_SUCCESS_SYNC;
+    TransferMode mode = transferMode();
+    mode.sendEnd = mode.sendEnd && end;
+    return data.empty() ? VI_SUCCESS : m_transport->write(data, mode, limit, count);
 }
 
-ViStatus InstrumentSession::writeAsync(std::span<const std::byte> data, ViJobId &job)
+ViStatus InstrumentSession::readAsync(std::span<std::byte> buffer, ViJobId *job)
 {
-    job = ++m_lastJob;
-    Event done{.type = VI_EVENT_IO_COMPLETION, .operation = "viWriteAsync", .job = job};
-    done.buffer = const_cast<std::byte *>(data.data());
-    std::size_t count = 0;
-    done.status = write(data, count);
-    done.count = count;
-    m_events->post(done);
-    return VI_SUCCESS_SYNC;
+    return startJob(true, buffer, job);
+}
+
+ViStatus InstrumentSession::writeAsync(std::span<const std::byte> data, ViJobId *job)
+{
+    return startJob(false, {const_cast<std::byte *>(data.data()), data.size()}, job);
+}
+
+ViStatus InstrumentSession::startJob(bool reads, std::span<std::byte> buffer, ViJobId *job)
+{
+    const ViStatus status = mayTransfer();
+    return status == VI_SUCCESS ? m_jobs.start(reads, buffer, job) : status;
+}
+
+/// On the thread of the jobs. Time-out, attributes and locks are those that hold when the job's turn to begin has come.
+ViStatus InstrumentSession::carryOut(const AsyncTransfers::Job &job, const std::atomic<bool> &cancelled,
+                                     std::size_t &count)
+{
+    const CallWatch watch(m_interruptions);
+    if (const ViStatus status = mayTransfer(); status != VI_SUCCESS)
+        return status;
+    if (job.reads && job.buffer.empty())
+        return VI_SUCCESS_MAX_CNT;
+    const os::Deadline deadline = operationDeadline();
+    if (const ViStatus status = entered(m_gate.enterAt(job.place, deadline, cancelled), watch); status != VI_SUCCESS)
+        return status;
+    const GateTurn turn(m_gate);
+    const AsyncTransfers::Talking talking(m_jobs);
+    if (cancelled.load())
+        return VI_ERROR_ABORT;
+    const os::WaitLimit limit{deadline, m_wakeup};
+    return job.reads ? m_transport->read(job.buffer, transferMode(), limit, count)
+                     : transfer(job.buffer, true, limit, count);
 }
 
 ViStatus InstrumentSession::readStatusByte(ViUInt16 &status)
@@ -290,14 +319,15 @@ ViStatus InstrumentSession::terminate(ViUInt16 degree, ViJobId job)
 {
     if (degree != VI_NULL)
         return VI_ERROR_INV_DEGREE;
-    if (job != VI_NULL)
-        return VI_ERROR_INV_JOB_ID;
     if (inherited())
         return VI_ERROR_CONN_LOST;
+    if (job != VI_NULL)
+        return m_jobs.terminate(job);
     ++m_interruptions.terminations;
     m_wakeup.terminate();
     m_locks.wake();
     m_events->terminate();
+    m_jobs.terminateAll();
     return VI_SUCCESS;
 }
 
@@ -336,10 +366,10 @@ ViStatus InstrumentSession::enableEvent(ViEventType type, ViUInt16 mechanism, Vi
         return status;
     // Events ignore locks, so this takes the turn without asking for them.
     const auto deadline = os::Deadline::afterVisaTimeout(static_cast<ViUInt32>(m_attributes.number(VI_ATTR_TMO_VALUE)));
-    const ViStatus entered = enterGate(deadline, CallWatch(m_interruptions));
-    if (entered != VI_SUCCESS) {
+    const ViStatus turned = entered(m_gate.enter(deadline), CallWatch(m_interruptions));
+    if (turned != VI_SUCCESS) {
         m_events->disable(type, VI_ALL_MECH);
-        return entered;
+        return turned;
     }
     const GateTurn turn(m_gate);
     const auto notify = [events = std::weak_ptr(m_events)] {
@@ -440,6 +470,7 @@ ViStatus InstrumentSession::close()
     m_gate.close();
     m_formatted.close();
     m_locks.wake();
+    m_jobs.close();
     m_events->close();
     m_gate.awaitEmpty();
     if (m_transport)

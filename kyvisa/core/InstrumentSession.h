@@ -1,5 +1,6 @@
 #pragma once
 
+#include "kyvisa/core/AsyncTransfers.h"
 #include "kyvisa/core/AttributeStore.h"
 #include "kyvisa/core/EventHub.h"
 #include "kyvisa/core/FormattedIo.h"
@@ -67,9 +68,9 @@ public:
     ViStatus readStatusByte(ViUInt16 &status);
     ViStatus assertTrigger(ViUInt16 protocol);
     ViStatus clear();
-    /// Carried out before the call returns; the completion is posted as an event.
-    ViStatus readAsync(std::span<std::byte> buffer, ViJobId &job);
-    ViStatus writeAsync(std::span<const std::byte> data, ViJobId &job);
+    /// Begin a transfer whose end VI_EVENT_IO_COMPLETION tells. @param job receives its number before it begins; may be null.
+    ViStatus readAsync(std::span<std::byte> buffer, ViJobId *job);
+    ViStatus writeAsync(std::span<const std::byte> data, ViJobId *job);
     ViStatus controlRemote(ViUInt16 mode);
     // On GPIB interfaces alone.
     ViStatus controlAttention(ViUInt16 mode);
@@ -97,7 +98,10 @@ private:
     ViStatus perform(os::Deadline deadline, const Operation &operation);
     template <typename Operation>
     ViStatus inTurn(os::Deadline deadline, const CallWatch &watch, const Operation &operation);
-    ViStatus enterGate(os::Deadline deadline, const CallWatch &watch);
+    ViStatus entered(IoGate::Entered entered, const CallWatch &watch);
+    ViStatus startJob(bool reads, std::span<std::byte> buffer, ViJobId *job);
+    ViStatus carryOut(const AsyncTransfers::Job &job, const std::atomic<bool> &cancelled, std::size_t &count);
+    ViStatus transfer(std::span<const std::byte> data, bool end, const os::WaitLimit &limit, std::size_t &count);
     TransferMode transferMode() const;
     bool isInterface() const; ///< a GPIB interface, not an instrument
 
@@ -110,8 +114,8 @@ private:
     os::Wakeup m_wakeup;
     IoGate m_gate;
     FormattedIo m_formatted{*this};
-    std::atomic<ViJobId> m_lastJob{0};
     std::atomic<bool> m_opened{false};
+    AsyncTransfers m_jobs; ///< last: its thread uses all the others
 };
 
 } // namespace kyvisa

@@ -2,23 +2,37 @@
 
 #include "kyvisa/os/Deadline.h"
 
+#include <atomic>
 #include <condition_variable>
+#include <cstdint>
+#include <deque>
 #include <mutex>
 
 namespace kyvisa
 {
 
 /**
- * A session's turn: one thread at a time talks on its connection, the others wait with a deadline. Unlike a mutex the
- * wait ends when the session is closed.
+ * A session's turn: one thread at a time talks on its connection, the others wait with a deadline, and who came first goes
+ * first. Unlike a mutex the wait ends when the session is closed.
+ *
+ * A place in the line can be taken before there is a thread that waits in it: an asynchronous transfer stands where its call
+ * came, between the calls before and behind it.
  */
 class IoGate
 {
 public:
-    enum class Entered { Yes, TimedOut, Closed };
+    enum class Entered { Yes, TimedOut, Closed, Cancelled };
+    using Place = std::uint64_t;
 
     Entered enter(os::Deadline deadline);
     void leave();
+
+    /// Takes the last place in the line, for one enterAt() or giveUp().
+    Place reserve();
+    /// Waits in a place that was reserved. Ends with Cancelled once @p cancelled is set and wake() called.
+    Entered enterAt(Place place, os::Deadline deadline, const std::atomic<bool> &cancelled);
+    void giveUp(Place place);
+    void wake();
 
     /// No one enters any more; those who wait leave with Closed.
     void close();
@@ -26,11 +40,18 @@ public:
     void awaitEmpty();
 
 private:
+    Entered waitInLine(std::unique_lock<std::mutex> &lock, Place place, os::Deadline deadline,
+                       const std::atomic<bool> *cancelled);
+    Place join();
+    void leaveLine(Place place);
+
     std::mutex m_mutex;
     std::condition_variable m_changed;
+    std::deque<Place> m_line; ///< who waits, in order
+    Place m_lastPlace = 0;
     bool m_busy = false;
     bool m_closed = false;
-    int m_waiting = 0;
+    bool m_awaited = false;
 };
 
 /// Leaves a gate that was entered when the operation is over, also by an exception.

@@ -147,6 +147,7 @@ ViStatus SessionLocks::lockOnTop(ViUInt32 timeout, const CallWatch &watch)
     case IoGate::Entered::TimedOut:
         return VI_ERROR_TMO;
     case IoGate::Entered::Closed:
+    case IoGate::Entered::Cancelled:
         return VI_ERROR_INV_OBJECT;
     case IoGate::Entered::Yes:
         break;
@@ -174,6 +175,7 @@ ViStatus SessionLocks::unlock()
     case IoGate::Entered::TimedOut:
         return VI_ERROR_TMO;
     case IoGate::Entered::Closed:
+    case IoGate::Entered::Cancelled:
         return VI_ERROR_INV_OBJECT;
     case IoGate::Entered::Yes:
         break;

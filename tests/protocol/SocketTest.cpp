@@ -1,15 +1,19 @@
 // Raw sockets: what the instrument says, and the exact bytes that the library must have sent.
 #include "support/ClosedPort.h"
+#include "support/Completion.h"
 #include "support/ScriptedPeer.h"
 #include "support/Stopwatch.h"
 #include "support/VisaSession.h"
 
 #include <atomic>
 #include <filesystem>
+#include <future>
 #include <gtest/gtest.h>
 #include <thread>
 
 using test::ClosedPort;
+using test::Completion;
+using test::nextCompletion;
 using test::PeerConnection;
 using test::ScriptedPeer;
 using test::Stopwatch;
@@ -479,42 +483,76 @@ TEST(Socket, OpeningWhereNobodyListensFailsAtOnce)
     EXPECT_EQ(session.vi, VI_NULL);
 }
 
-TEST(Socket, CarriesOutAsynchronousTransfersAtOnceAndPostsTheirCompletion)
+TEST(Socket, AsynchronousTransfersReturnBeforeThePeerHasSpoken)
 {
-    ScriptedPeer peer([](ScriptedPeer &self) {
+    std::promise<void> maySpeak;
+    ScriptedPeer peer([&](ScriptedPeer &self) {
         PeerConnection client = self.accept();
         client.expect("ab");
+        maySpeak.get_future().wait();
         client.send("xyz");
         client.expectClosed();
     });
     VisaSession session;
     ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(session.set(VI_ATTR_TMO_VALUE, 60000), VI_SUCCESS);
     ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_IO_COMPLETION, VI_QUEUE, 0), VI_SUCCESS);
     ViJobId first = 0;
     ViJobId second = 0;
     std::array<ViByte, 3> buffer{};
-    EXPECT_EQ(viWriteAsync(session.vi, reinterpret_cast<ViConstBuf>("ab"), 2, &first), VI_SUCCESS_SYNC);
-    EXPECT_EQ(viReadAsync(session.vi, buffer.data(), 3, &second), VI_SUCCESS_SYNC);
-    EXPECT_NE(first, second);
-    ViEventType type = 0;
-    ViEvent context = 0;
-    EXPECT_EQ(viWaitOnEvent(session.vi, VI_EVENT_IO_COMPLETION, 0, &type, &context), VI_SUCCESS_QUEUE_NEMPTY);
-    ViJobId job = 0;
-    EXPECT_EQ(viGetAttribute(context, VI_ATTR_JOB_ID, &job), VI_SUCCESS);
-    EXPECT_EQ(job, first);
-    EXPECT_EQ(viClose(context), VI_SUCCESS);
-    EXPECT_EQ(viWaitOnEvent(session.vi, VI_ALL_ENABLED_EVENTS, 0, &type, &context), VI_SUCCESS);
-    ViUInt64 count = 0;
-    ViBuf where = nullptr;
-    ViStatus status = -1;
-    EXPECT_EQ(viGetAttribute(context, VI_ATTR_RET_COUNT, &count), VI_SUCCESS);
-    EXPECT_EQ(viGetAttribute(context, VI_ATTR_BUFFER, &where), VI_SUCCESS);
-    EXPECT_EQ(viGetAttribute(context, VI_ATTR_STATUS, &status), VI_SUCCESS);
-    EXPECT_EQ(count, 3u);
-    EXPECT_EQ(where, buffer.data());
-    EXPECT_EQ(status, VI_SUCCESS_MAX_CNT);
-    viClose(context);
+    EXPECT_EQ(viWriteAsync(session.vi, reinterpret_cast<ViConstBuf>("ab"), 2, &first), VI_SUCCESS);
+    EXPECT_EQ(viReadAsync(session.vi, buffer.data(), 3, &second), VI_SUCCESS);
+    Completion completion = nextCompletion(session.vi);
+    EXPECT_EQ(completion.waited, VI_SUCCESS); // the read cannot be over
+    EXPECT_EQ(completion.job, first);
+    EXPECT_EQ(completion.status, VI_SUCCESS);
+    EXPECT_EQ(nextCompletion(session.vi, VI_TMO_IMMEDIATE).waited, VI_ERROR_TMO);
+    maySpeak.set_value();
+    completion = nextCompletion(session.vi);
+    EXPECT_EQ(completion.job, second);
+    EXPECT_EQ(completion.count, 3u);
+    EXPECT_EQ(completion.buffer, buffer.data());
+    EXPECT_EQ(completion.status, VI_SUCCESS_MAX_CNT);
+    EXPECT_EQ(std::string(buffer.begin(), buffer.end()), "xyz");
     viClose(session.vi);
+}
+
+TEST(Socket, AsynchronousTransfersEndWithTheirConnection)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        PeerConnection client = self.accept();
+        client.send("half");
+    });
+    VisaSession session;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(session.set(VI_ATTR_TMO_VALUE, VI_TMO_INFINITE), VI_SUCCESS);
+    ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_IO_COMPLETION, VI_QUEUE, 0), VI_SUCCESS);
+    std::array<ViByte, 8> buffer{};
+    for (int i = 0; i < 3; ++i)
+        EXPECT_EQ(viReadAsync(session.vi, buffer.data(), 8, nullptr), VI_SUCCESS);
+    const Completion cut = nextCompletion(session.vi);
+    EXPECT_EQ(cut.status, VI_ERROR_CONN_LOST);
+    EXPECT_EQ(cut.count, 4u);
+    EXPECT_EQ(nextCompletion(session.vi).status, VI_ERROR_CONN_LOST);
+    EXPECT_EQ(nextCompletion(session.vi).status, VI_ERROR_CONN_LOST);
+    viClose(session.vi);
+}
+
+TEST(Socket, JobsThatWaitAreBounded)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
+    VisaSession session;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(session.set(VI_ATTR_TMO_VALUE, VI_TMO_INFINITE), VI_SUCCESS);
+    ViByte byte = 0;
+    ViStatus status = VI_SUCCESS;
+    int taken = 0;
+    while (taken < 5000 && (status = viReadAsync(session.vi, &byte, 1, nullptr)) == VI_SUCCESS)
+        ++taken;
+    EXPECT_EQ(status, VI_ERROR_QUEUE_ERROR);
+    EXPECT_GE(taken, 1024);
+    EXPECT_LE(taken, 1025); // the one that runs does not wait
+    EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
 }
 
 std::size_t openDescriptors()

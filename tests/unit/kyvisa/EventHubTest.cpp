@@ -2,7 +2,12 @@
 #include "kyvisa/include/visa.h"
 
 #include <algorithm>
+#include <atomic>
+#include <condition_variable>
+#include <functional>
+#include <future>
 #include <gtest/gtest.h>
+#include <mutex>
 #include <thread>
 
 using namespace kyvisa;
@@ -238,6 +243,175 @@ TEST_F(Events, DisablingEndsAWaitThatNothingCanEndAnyMore)
     });
     m_hub->disable(Srq, VI_QUEUE);
     waiting.join();
+}
+
+/// A handler that does what the test says. Counts its calls and can be waited for from other threads.
+struct Actor {
+    std::function<void(ViEvent)> act = [](ViEvent) {};
+    std::mutex mutex;
+    std::condition_variable changed;
+    int calls = 0;
+
+    static ViStatus call(ViSession, ViEventType, ViEvent context, ViAddr user)
+    {
+        auto &self = *static_cast<Actor *>(user);
+        self.act(context);
+        const std::lock_guard lock(self.mutex);
+        ++self.calls;
+        self.changed.notify_all();
+        return VI_SUCCESS;
+    }
+    bool awaitCalls(int count)
+    {
+        std::unique_lock lock(mutex);
+        return changed.wait_for(lock, std::chrono::seconds(60), [&] { return calls >= count; });
+    }
+};
+
+TEST_F(Events, AHandlerThatAnotherOneTakesOutIsNotCalled)
+{
+    Actor remover;
+    remover.act = [&](ViEvent) { EXPECT_EQ(m_hub->uninstall(Failed, handler<'a'>, &m_diary), VI_SUCCESS); };
+    ASSERT_EQ(m_hub->install(Failed, handler<'a'>, &m_diary), VI_SUCCESS);
+    ASSERT_EQ(m_hub->install(Failed, Actor::call, &remover), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Failed, VI_HNDLR, 0), VI_SUCCESS);
+    m_hub->raiseException({.type = Failed});
+    EXPECT_EQ(remover.calls, 1);
+    EXPECT_EQ(m_diary.order(), "");
+}
+
+TEST_F(Events, AHandlerMayTakeItselfOut)
+{
+    Actor once;
+    once.act = [&](ViEvent) { EXPECT_EQ(m_hub->uninstall(Srq, Actor::call, &once), VI_SUCCESS); };
+    ASSERT_EQ(m_hub->install(Srq, Actor::call, &once), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Srq, VI_HNDLR, 0), VI_SUCCESS);
+    post(Srq);
+    ASSERT_TRUE(once.awaitCalls(1));
+    EXPECT_EQ(m_hub->disable(Srq, VI_HNDLR), VI_SUCCESS_EVENT_DIS);
+}
+
+// Programs free what a handler uses as soon as it is taken out.
+TEST_F(Events, TakingAHandlerOutWaitsForTheCallThatIsGoingOn)
+{
+    std::promise<void> entered;
+    std::promise<void> mayReturn;
+    std::atomic<bool> returned{false};
+    Actor slow;
+    slow.act = [&](ViEvent) {
+        entered.set_value();
+        mayReturn.get_future().wait();
+        for (int i = 0; i < 1000; ++i)
+            std::this_thread::yield();
+        returned = true;
+    };
+    ASSERT_EQ(m_hub->install(Srq, Actor::call, &slow), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Srq, VI_HNDLR, 0), VI_SUCCESS);
+    post(Srq);
+    entered.get_future().wait();
+    mayReturn.set_value();
+    EXPECT_EQ(m_hub->uninstall(Srq, Actor::call, &slow), VI_SUCCESS);
+    EXPECT_TRUE(returned);
+}
+
+TEST_F(Events, NoOtherHandlerIsCalledOnceOneHasClosedTheSession)
+{
+    Actor closer;
+    closer.act = [&](ViEvent) { m_hub->close(); };
+    ASSERT_EQ(m_hub->install(Failed, handler<'a'>, &m_diary), VI_SUCCESS);
+    ASSERT_EQ(m_hub->install(Failed, Actor::call, &closer), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Failed, VI_HNDLR, 0), VI_SUCCESS);
+    m_hub->raiseException({.type = Failed});
+    EXPECT_EQ(closer.calls, 1);
+    EXPECT_EQ(m_diary.order(), "");
+}
+
+TEST_F(Events, WhatFailsInsideAnExceptionHandlerRaisesNoOtherException)
+{
+    Actor failing;
+    failing.act = [&](ViEvent) { m_hub->raiseException({.type = Failed}); };
+    ASSERT_EQ(m_hub->install(Failed, Actor::call, &failing), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Failed, VI_HNDLR, 0), VI_SUCCESS);
+    m_hub->raiseException({.type = Failed});
+    EXPECT_EQ(failing.calls, 1);
+}
+
+TEST_F(Events, EventsThatWaitedReachTheHandlersBeforeNewerOnes)
+{
+    std::vector<ViEvent> order; // contexts are numbered as they are made
+    Actor actor;
+    actor.act = [&](ViEvent context) {
+        if (order.empty())
+            post(Srq); // while the older ones are being handed over
+        order.push_back(context);
+    };
+    ASSERT_EQ(m_hub->install(Srq, Actor::call, &actor), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Srq, VI_SUSPEND_HNDLR, 0), VI_SUCCESS);
+    for (int i = 0; i < 3; ++i)
+        post(Srq);
+    ASSERT_EQ(m_hub->enable(Srq, VI_HNDLR, 0), VI_SUCCESS);
+    {
+        const std::lock_guard lock(actor.mutex);
+        EXPECT_GE(actor.calls, 3);
+    }
+    ASSERT_TRUE(actor.awaitCalls(4));
+    EXPECT_EQ(order, (std::vector<ViEvent>{1, 2, 3, 4}));
+}
+
+// A handler that is busy has received an event; what comes behind it has not, and waits.
+TEST_F(Events, EventsThatReachedNoHandlerWhenItWasDisabledWaitForTheNextEnabling)
+{
+    std::promise<void> entered;
+    std::promise<void> mayReturn;
+    Actor actor;
+    actor.act = [&, first = true](ViEvent) mutable {
+        if (!std::exchange(first, false))
+            return;
+        entered.set_value();
+        mayReturn.get_future().wait();
+    };
+    ASSERT_EQ(m_hub->install(Srq, Actor::call, &actor), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Srq, VI_HNDLR, 0), VI_SUCCESS);
+    post(Srq);
+    entered.get_future().wait();
+    post(Srq);
+    post(Srq);
+    EXPECT_EQ(m_hub->disable(Srq, VI_HNDLR), VI_SUCCESS);
+    mayReturn.set_value();
+    ASSERT_TRUE(actor.awaitCalls(1));
+    EXPECT_EQ(m_hub->enable(Srq, VI_SUSPEND_HNDLR, 0), VI_SUCCESS);
+    EXPECT_EQ(m_hub->enable(Srq, VI_HNDLR, 0), VI_SUCCESS);
+    EXPECT_EQ(actor.calls, 3);
+}
+
+TEST_F(Events, HandlersGetMoreEventsThanTheQueueHolds)
+{
+    std::promise<void> entered;
+    std::promise<void> mayReturn;
+    Actor actor;
+    actor.act = [&, first = true](ViEvent) mutable {
+        if (!std::exchange(first, false))
+            return;
+        entered.set_value();
+        mayReturn.get_future().wait();
+    };
+    ASSERT_TRUE(m_hub->setQueueLength(2));
+    ASSERT_EQ(m_hub->install(Done, Actor::call, &actor), VI_SUCCESS);
+    ASSERT_EQ(m_hub->enable(Done, VI_HNDLR, 0), VI_SUCCESS);
+    post(Done);
+    entered.get_future().wait();
+    for (ViJobId job = 1; job < 1000; ++job)
+        post(Done, job);
+    mayReturn.set_value();
+    EXPECT_TRUE(actor.awaitCalls(1000));
+}
+
+TEST_F(Events, HandlersAreBounded)
+{
+    for (int i = 0; i < 1000; ++i)
+        ASSERT_EQ(m_hub->install(Srq, handler<'a'>, &m_diary), VI_SUCCESS) << i;
+    EXPECT_EQ(m_hub->install(Srq, handler<'a'>, &m_diary), VI_ERROR_HNDLR_NINSTALLED);
+    EXPECT_EQ(m_hub->install(Done, handler<'a'>, &m_diary), VI_SUCCESS);
 }
 
 TEST_F(Events, ExceptionsThatAreNotEnabledDisturbNobody)
