@@ -106,7 +106,7 @@ bool parseHost(std::string_view text, ResourceName &name)
     }
     name.host = text;
     return !text.empty() && std::none_of(text.begin(), text.end(), [](unsigned char c) {
-        return c <= ' ' || c == '[' || c == ']' || c == '/' || c == 0x7F;
+        return c <= ' ' || c == '[' || c == ']' || c == '/' || c == '@' || c == 0x7F;
     });
 }
 

@@ -23,8 +23,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
                               "GPIB0::7::12::INSTR", "GPIB0::INTFC", "ASRL1::INSTR", resource.c_str()}) {
         const std::string text = known;
         const bool matches = expression->matches(text);
+        // The beginnings that a search asks about, and one that the input chooses.
         if (matches)
-            for (std::size_t length = 0; length <= text.size(); ++length)
+            for (const std::size_t length : {std::size_t{0}, std::size_t{5}, size % (text.size() + 1), text.size()})
                 promise(expression->mayMatch(text.substr(0, length)));
         // Letters count without their case. The condition compares texts as they are, so a match is only sure to stay without one.
         std::string upper = text;

@@ -70,11 +70,11 @@ INSTANTIATE_TEST_SUITE_P(
                     "TCPIP99999::box", "TCPIP::box::SOCKET", "TCPIP::box::0::SOCKET", "TCPIP::box::70000::SOCKET",
                     "TCPIP::box::-1::SOCKET", "TCPIP::box::5025x::SOCKET", "TCPIP::box::hislip0,::INSTR",
                     "TCPIP::box::hislip0,0::INSTR", "TCPIP::box::hislip0,99999", "TCPIP::box::hislip0::extra::INSTR",
-                    "TCPIP::box::hislip0:", "TCPIP::box:::inst0", "TCPIP::[::1::hislip0", "TCPIP::[box]::hislip0",
-                    "TCPIP::fe80:1::hislip0", "TCPIP::a b::hislip0", "TCPIP::box::INTFC", "GPIB::31", "GPIB::5::32",
-                    "GPIB", "GPIB::x", "GPIB::5::INTFC", "ASRL1::x", "ASRL/dev/tty S0::INSTR", "ASRL/etc/passwd::INSTR",
-                    "ASRL/dev/ttyS0::x::INSTR", "USB::0x1234::INSTR", "USB::0xZZ::0x1::S", "VXI::SOCKET",
-                    "PXI::x::INSTR"));
+                    "TCPIP::box::hislip0:", "TCPIP::me@you@box::hislip0", "TCPIP::box:::inst0", "TCPIP::[::1::hislip0",
+                    "TCPIP::[box]::hislip0", "TCPIP::fe80:1::hislip0", "TCPIP::a b::hislip0", "TCPIP::box::INTFC",
+                    "GPIB::31", "GPIB::5::32", "GPIB", "GPIB::x", "GPIB::5::INTFC", "ASRL1::x",
+                    "ASRL/dev/tty S0::INSTR", "ASRL/etc/passwd::INSTR", "ASRL/dev/ttyS0::x::INSTR",
+                    "USB::0x1234::INSTR", "USB::0xZZ::0x1::S", "VXI::SOCKET", "PXI::x::INSTR"));
 
 TEST(ResourceName, KeepsHostAndCredentialsApart)
 {
