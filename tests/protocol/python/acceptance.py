@@ -450,11 +450,18 @@ def reads_and_writes_asynchronously(simulator):
         expect(done["status"] in (StatusCode.success, StatusCode.success_termination_character_read), done["status"])
         equal(done["count"], len(buffer.value))
         equal(len(buffer.value.decode().split(",")), 4)
-        # One that nobody answers is ended, and says so.
+        # One that nobody answers is ended by its time-out, or by the user, and says so.
         instrument.timeout = 100
         buffer, job, status = library.read_asynchronously(session, 1000)
         expect(status >= 0, status)
         equal(completion(instrument, job)["status"], StatusCode.error_timeout)
+        instrument.timeout = PATIENCE
+        buffer, job, status = library.read_asynchronously(session, 1000)
+        equal(status, StatusCode.success)
+        library.terminate(session, 0, job)
+        equal(completion(instrument, job)["status"], StatusCode.error_abort)
+        instrument.clear()
+        equal(instrument.query("*OPC?").strip(), "1")
         instrument.disable_event(EventType.io_completion, EventMechanism.queue)
         instrument.close()
     resources.close()
