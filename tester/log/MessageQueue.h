@@ -1,8 +1,7 @@
 #pragma once
 
 #include "log/FastBuffer.h"
-
-#include <QSemaphore>
+#include "log/LightSemaphore.h"
 
 #include <pthread.h>
 
@@ -43,7 +42,7 @@ private:
     std::uint32_t m_write = 0;            ///< guarded by m_mutex
     std::atomic<std::uint32_t> m_read{0}; ///< the consumer's; producers look at it once stopped
     std::atomic<bool> m_stopped{false};
-    QSemaphore m_free;
-    QSemaphore m_used;
+    LightSemaphore m_free;
+    LightSemaphore m_used;
     pthread_mutex_t m_mutex; ///< process-shared; serialises producers
 };
