@@ -47,6 +47,24 @@ int connectTo(std::uint16_t port)
     return fd;
 }
 
+int listenSomewhere()
+{
+    const int listener = ::socket(AF_INET, SOCK_STREAM, 0);
+    const sockaddr_in address = loopback(0);
+    if (::bind(listener, reinterpret_cast<const sockaddr *>(&address), sizeof address) != 0 ||
+        ::listen(listener, 1) != 0)
+        throw std::runtime_error("cannot listen");
+    return listener;
+}
+
+std::uint16_t portOf(int listener)
+{
+    sockaddr_in address{};
+    socklen_t length = sizeof address;
+    ::getsockname(listener, reinterpret_cast<sockaddr *>(&address), &length);
+    return ntohs(address.sin_port);
+}
+
 void sendAll(int fd, const void *data, std::size_t size)
 {
     const char *at = static_cast<const char *>(data);
@@ -82,6 +100,36 @@ Header receiveHeader(int fd)
 }
 
 } // namespace
+
+BareEcho::BareEcho()
+{
+    const int listener = listenSomewhere();
+    const std::uint16_t port = portOf(listener);
+    m_process = ::fork();
+    if (m_process == 0) {
+        const int peer = ::accept(listener, nullptr, nullptr);
+        noDelay(peer);
+        char byte;
+        while (::recv(peer, &byte, 1, 0) == 1)
+            sendAll(peer, &byte, 1);
+        ::_exit(0);
+    }
+    m_socket = connectTo(port);
+    ::close(listener);
+}
+
+BareEcho::~BareEcho()
+{
+    ::close(m_socket);
+    ::waitpid(m_process, nullptr, 0);
+}
+
+void BareEcho::ping()
+{
+    char byte = '.';
+    sendAll(m_socket, &byte, 1);
+    receiveAll(m_socket, &byte, 1);
+}
 
 BareSocket::BareSocket(std::uint16_t port) : m_socket(connectTo(port)) {}
 
@@ -172,12 +220,8 @@ std::size_t BareHislip::query(std::string_view command, char *answer, std::size_
 
 BareCopy::BareCopy(std::size_t size) : m_size(size)
 {
-    const int listener = ::socket(AF_INET, SOCK_STREAM, 0);
-    sockaddr_in address = loopback(0);
-    socklen_t length = sizeof address;
-    if (::bind(listener, reinterpret_cast<sockaddr *>(&address), length) != 0 || ::listen(listener, 1) != 0)
-        throw std::runtime_error("cannot listen");
-    ::getsockname(listener, reinterpret_cast<sockaddr *>(&address), &length);
+    const int listener = listenSomewhere();
+    const std::uint16_t port = portOf(listener);
     m_process = ::fork();
     if (m_process == 0) {
         const int peer = ::accept(listener, nullptr, nullptr);
@@ -195,7 +239,7 @@ BareCopy::BareCopy(std::size_t size) : m_size(size)
         }
         ::_exit(0);
     }
-    m_socket = connectTo(ntohs(address.sin_port));
+    m_socket = connectTo(port);
     ::close(listener);
 }
 

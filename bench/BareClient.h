@@ -8,6 +8,22 @@
 namespace bench
 {
 
+/// What the machine can do at all: one byte to a child process on the same core and back, over a loopback connection.
+class BareEcho
+{
+public:
+    BareEcho();
+    ~BareEcho();
+    BareEcho(const BareEcho &) = delete;
+    BareEcho &operator=(const BareEcho &) = delete;
+
+    void ping();
+
+private:
+    int m_socket = -1;
+    pid_t m_process = -1;
+};
+
 /// The limit of a raw socket query: one send, one recv, nothing checked but the line feed.
 class BareSocket
 {

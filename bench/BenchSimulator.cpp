@@ -24,7 +24,7 @@ BenchSimulator::BenchSimulator()
         ::close(out[0]);
         ::close(out[1]);
         ::execl(SIMULATOR_PROGRAM, SIMULATOR_PROGRAM, "--hislip", "0", "--socket", "0", "--vxi11", "0", "--portmapper",
-                "0", nullptr);
+                "0", "--max-clients", "100", nullptr);
         ::_exit(127);
     }
     ::close(out[1]);

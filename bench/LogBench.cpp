@@ -1,14 +1,15 @@
 // What logging costs the thread that emits: one logged call above the bare library call, and one line into both sinks against
 // spdlog's asynchronous logger. Bursts stay below the queues' sizes; the writer runs on the other core and flushes each line.
+//
+//     bench-log [--rounds N]
 
+#include "bench/Measurement.h"
 #include "log/Log.h"
 #include "log/LogFile.h"
 #include "log/SessionLog.h"
 #include "visa/VisaSessionWithLog.h"
 
 #include <visa.h>
-
-#include <benchmark/benchmark.h>
 
 #include <spdlog/async.h>
 #include <spdlog/async_logger.h>
@@ -20,18 +21,18 @@
 #include <QFile>
 #include <QTemporaryDir>
 
-#include <pthread.h>
-#include <sched.h>
-
+#include <array>
 #include <atomic>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <functional>
 #include <memory>
 #include <new>
 #include <string>
 #include <thread>
+#include <vector>
 
 namespace
 {
@@ -61,16 +62,9 @@ void operator delete(void *memory, std::size_t) noexcept
 namespace
 {
 
-constexpr int Burst = 8000; // below the 16383 lines that the file queue holds
+constexpr std::size_t SlicesOfABurst = 80;
+constexpr int CallsOfASlice = 100; // a burst stays below the 16383 lines that the file queue holds
 constexpr const char *Text = "viWrite(vi= 2,buf= \"*IDN?\\n\",cnt= 6,retCnt= 6)";
-
-void runOn(int core)
-{
-    cpu_set_t cores;
-    CPU_ZERO(&cores);
-    CPU_SET(core, &cores);
-    sched_setaffinity(0, sizeof cores, &cores); // refused on a machine with one core: both sides share it then
-}
 
 /// Log, log file and writer thread as a session worker has them.
 class Logging
@@ -81,7 +75,7 @@ public:
           m_front(m_log.get(), nullptr)
     {
         m_writer = std::thread([this] {
-            runOn(1);
+            bench::runOn(1);
             ThreadForFileLog(m_log.get());
         });
     }
@@ -123,121 +117,141 @@ private:
     std::thread m_writer;
 };
 
-Logging *logging = nullptr;
-
-/// Times bursts of calls by hand: the pause between two of them, in which the writer catches up, does not count.
-template <typename Call, typename Pause>
-void bursts(benchmark::State &state, Call call, Pause pause)
+template <typename Value>
+void keep(Value &&value)
 {
-    std::uint64_t allocated = 0;
-    for (auto _ : state) {
-        const std::uint64_t before = allocations;
-        const auto start = std::chrono::steady_clock::now();
-        for (int i = 0; i < Burst; ++i)
+    asm volatile("" : : "r,m"(value) : "memory"); // the optimiser must not drop what computed it
+}
+
+/// One burst of calls: nanoseconds a call, averaged over slices of it, and how many allocations all of them made.
+struct Burst {
+    std::vector<double> slices;
+    std::uint64_t allocations;
+};
+
+template <typename Call>
+Burst burst(Call call)
+{
+    const std::uint64_t before = allocations;
+    std::array<double, SlicesOfABurst> slices;
+    auto start = std::chrono::steady_clock::now();
+    for (double &slice : slices) {
+        for (int i = 0; i < CallsOfASlice; ++i)
             call();
-        const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
-        allocated += allocations - before;
-        state.SetIterationTime(elapsed.count() / Burst);
-        pause();
+        const auto end = std::chrono::steady_clock::now();
+        slice = std::chrono::duration<double, std::nano>(end - start).count() / CallsOfASlice;
+        start = end;
     }
-    state.counters["allocations"] = static_cast<double>(allocated) / (static_cast<double>(state.iterations()) * Burst);
+    const std::uint64_t allocated = allocations - before;
+    return {{slices.begin(), slices.end()}, allocated};
 }
 
-void bareCall(benchmark::State &state)
+struct Side {
+    const char *name;
+    std::function<Burst()> burst;
+    std::function<void()> drain; ///< the pause in which the writer catches up does not count
+};
+
+std::shared_ptr<spdlog::async_logger> makeSpdlogger(const QString &folder)
 {
-    ViUInt32 written = 0;
-    bursts(
-        state,
-        [&] {
-            viWrite(2, reinterpret_cast<ViConstBuf>("*IDN?\n"), 6, &written);
-            benchmark::DoNotOptimize(written);
-        },
-        [] {});
+    spdlog::init_thread_pool(16384, 1, [] { bench::runOn(1); });
+    const spdlog::sinks_init_list sinks{
+        std::make_shared<spdlog::sinks::basic_file_sink_mt>((folder + "/spdlog.txt").toStdString()),
+        std::make_shared<spdlog::sinks::ringbuffer_sink_mt>(8192)};
+    auto logger = std::make_shared<spdlog::async_logger>("bench", sinks, spdlog::thread_pool(),
+                                                         spdlog::async_overflow_policy::block);
+    logger->flush_on(spdlog::level::info); // each line is flushed, as in the log file
+    return logger;
 }
 
-void twoClockReadings(benchmark::State &state)
+/// The queue is empty when the flush that was put behind the burst has been carried out.
+void drain(spdlog::async_logger &logger)
 {
-    QElapsedTimer timer;
-    bursts(
-        state,
-        [&] {
-            timer.restart();
-            benchmark::DoNotOptimize(timer.nsecsElapsed());
-        },
-        [] {});
+    logger.flush();
+    while (spdlog::thread_pool()->queue_size() > 0)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
 }
 
-void loggedCall(benchmark::State &state, bool bothSinks)
+void measure(bench::Measurement &measurement, Logging &logging, spdlog::async_logger &spdlogger, std::size_t rounds)
 {
-    VisaSessionWithLog session(logging->front());
+    VisaSessionWithLog session(logging.front());
     session.open(const_cast<char *>("TCPIP::localhost::hislip0"), 0, 2000);
-    logging->sinks(bothSinks);
-    bursts(
-        state, [&] { benchmark::DoNotOptimize(session.write("*IDN?\n", 6)); },
-        [&] {
-            if (bothSinks)
-                logging->drain();
-        });
-    logging->sinks(false);
-}
-
-void oneLine(benchmark::State &state)
-{
-    logging->sinks(true);
-    FastBuffer line;
-    std::strncpy(line.text, Text, sizeof line.text);
+    QElapsedTimer timer;
+    ViUInt32 written = 0;
+    FastBuffer line{};
+    std::strncpy(line.text, Text, sizeof line.text - 1);
     line.status = VI_SUCCESS;
     line.duration = 15230;
-    bursts(
-        state, [&] { logging->front()->emitWriteMessage(&line); }, [] { logging->drain(); });
-    logging->sinks(false);
-}
-
-std::shared_ptr<spdlog::async_logger> spdlogger;
-
-void spdlogLine(benchmark::State &state)
-{
     const std::string_view text = Text;
-    bursts(
-        state, [&] { spdlogger->info(spdlog::string_view_t(text.data(), text.size())); },
-        [] {
-            // The queue is empty when the flush that was put behind the burst has been carried out.
-            spdlogger->flush();
-            while (spdlog::thread_pool()->queue_size() > 0)
-                std::this_thread::sleep_for(std::chrono::milliseconds(1));
-        });
+
+    const auto nothing = [] {};
+    const auto drained = [&] { logging.drain(); };
+    const Side sides[] = {
+        {"bareCall",
+         [&] {
+             return burst([&] {
+                 viWrite(2, reinterpret_cast<ViConstBuf>("*IDN?\n"), 6, &written);
+                 keep(written);
+             });
+         },
+         nothing},
+        {"twoClockReadings",
+         [&] {
+             return burst([&] {
+                 timer.restart();
+                 keep(timer.nsecsElapsed());
+             });
+         },
+         nothing},
+        {"loggedCall/off", [&] { return burst([&] { keep(session.write("*IDN?\n", 6)); }); }, nothing},
+        {"loggedCall/bothSinks",
+         [&] {
+             logging.sinks(true);
+             const Burst result = burst([&] { keep(session.write("*IDN?\n", 6)); });
+             logging.sinks(false);
+             return result;
+         },
+         drained},
+        {"oneLine",
+         [&] {
+             logging.sinks(true);
+             const Burst result = burst([&] { logging.front()->emitWriteMessage(&line); });
+             logging.sinks(false);
+             return result;
+         },
+         drained},
+        {"spdlogLine", [&] { return burst([&] { spdlogger.info(spdlog::string_view_t(text.data(), text.size())); }); },
+         [&] { drain(spdlogger); }},
+    };
+    std::uint64_t allocated = 0;
+    for (std::size_t round = 0; round <= rounds; ++round)
+        for (const Side &side : sides) {
+            const Burst result = side.burst();
+            side.drain();
+            if (round == 0) // touches the memory
+                continue;
+            measurement.add(side.name, result.slices);
+            if (std::string_view(side.name) == "oneLine")
+                allocated += result.allocations;
+        }
+    measurement.setValue("allocationsOfALine",
+                         static_cast<double>(allocated) / static_cast<double>(rounds * SlicesOfABurst * CallsOfASlice));
 }
 
 } // namespace
-
-BENCHMARK(bareCall)->UseManualTime()->Iterations(20);
-BENCHMARK(twoClockReadings)->UseManualTime()->Iterations(20);
-BENCHMARK_CAPTURE(loggedCall, off, false)->UseManualTime()->Iterations(20);
-BENCHMARK_CAPTURE(loggedCall, bothSinks, true)->UseManualTime()->Iterations(20);
-BENCHMARK(oneLine)->UseManualTime()->Iterations(20);
-BENCHMARK(spdlogLine)->UseManualTime()->Iterations(20);
 
 int main(int argc, char **argv)
 {
     QTemporaryDir home;
     qputenv("HOME", home.path().toLocal8Bit());
-    runOn(0);
-
-    spdlog::init_thread_pool(16384, 1, [] { runOn(1); });
-    const spdlog::sinks_init_list sinks{
-        std::make_shared<spdlog::sinks::basic_file_sink_mt>((home.path() + "/spdlog.txt").toStdString()),
-        std::make_shared<spdlog::sinks::ringbuffer_sink_mt>(8192)};
-    spdlogger = std::make_shared<spdlog::async_logger>("bench", sinks, spdlog::thread_pool(),
-                                                       spdlog::async_overflow_policy::block);
-    spdlogger->flush_on(spdlog::level::info); // each line is flushed, as in the log file
-
-    Logging sessionLogging;
-    logging = &sessionLogging;
-    benchmark::Initialize(&argc, argv);
-    if (benchmark::ReportUnrecognizedArguments(argc, argv))
-        return 2;
-    benchmark::RunSpecifiedBenchmarks();
-    spdlogger.reset();
+    bench::runOn(0);
+    bench::Measurement measurement;
+    {
+        Logging logging;
+        auto spdlogger = makeSpdlogger(home.path());
+        measure(measurement, logging, *spdlogger, bench::numberOption(argc, argv, "--rounds", 100));
+    }
     spdlog::shutdown();
+    measurement.print();
     return 0;
 }

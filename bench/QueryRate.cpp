@@ -8,6 +8,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <string_view>
 
 int main(int argc, char **argv)
 {
@@ -19,6 +20,8 @@ int main(int argc, char **argv)
         std::fprintf(stderr, "usage: bench-query RESOURCE COUNT, with a resource that opens\n");
         return 2;
     }
+    if (std::string_view(argv[1]).ends_with("SOCKET"))
+        viSetAttribute(session, VI_ATTR_TERMCHAR_EN, VI_TRUE);
     std::array<ViByte, 1024> answer{};
     const auto begin = std::chrono::steady_clock::now();
     for (int i = 0; i < count; ++i) {

@@ -1,160 +1,69 @@
-// Queries over raw socket, HiSLIP and VXI-11, blocks over the first two: libkyvisa against bare clients on the same simulator, all on one core.
+// Queries over raw socket, HiSLIP and VXI-11, blocks over the first two: libkyvisa against bare clients on the same simulator, all
+// on one core, batches of both sides by turns.
+//
+//     bench-transport [--rounds N] [--block-rounds N]
 
 #include "bench/BareClient.h"
 #include "bench/BareVxi11.h"
 #include "bench/BenchSimulator.h"
-
-#include <visa.h>
-
-#include <benchmark/benchmark.h>
-
-#include <sched.h>
+#include "bench/Measurement.h"
+#include "bench/VisaClient.h"
 
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <memory>
+#include <functional>
 #include <string>
 #include <vector>
 
 namespace
 {
 
+using namespace bench;
+
 constexpr std::size_t BlockSize = 64u << 20;
+constexpr std::size_t QueriesOfABatch = 200;
+constexpr std::size_t WarmUp = 10; // behind another side's batch the caches are the other side's
 const std::string Query = "*IDN?\n";
 
-bench::BenchSimulator *simulator = nullptr;
-
-void must(ViStatus status, const char *what)
-{
-    if (status < VI_SUCCESS) {
-        std::fprintf(stderr, "%s: 0x%08X\n", what, static_cast<unsigned>(status));
-        std::exit(1);
-    }
-}
-
-enum class Protocol { Socket, Hislip, Vxi11 };
-
-std::string resourceOf(Protocol protocol)
-{
-    switch (protocol) {
-    case Protocol::Socket:
-        return "TCPIP::127.0.0.1::" + std::to_string(simulator->socketPort()) + "::SOCKET";
-    case Protocol::Hislip:
-        return "TCPIP::127.0.0.1::hislip0," + std::to_string(simulator->hislipPort()) + "::INSTR";
-    case Protocol::Vxi11:
-        break;
-    }
-    return "TCPIP::127.0.0.1::inst0::INSTR";
-}
-
-/// A session of libkyvisa on the benchmark's simulator.
-class Session
-{
-public:
-    explicit Session(Protocol protocol)
-    {
-        const std::string resource = resourceOf(protocol);
-        must(viOpenDefaultRM(&m_manager), "viOpenDefaultRM");
-        must(viOpen(m_manager, resource.c_str(), VI_NO_LOCK, 2000, &m_session), "viOpen");
-        must(viSetAttribute(m_session, VI_ATTR_TMO_VALUE, 30000), "time-out");
-        if (protocol == Protocol::Socket)
-            must(viSetAttribute(m_session, VI_ATTR_TERMCHAR_EN, VI_TRUE), "termination character");
-    }
-
-    ~Session() { viClose(m_manager); }
-
-    ViUInt32 query(char *answer, ViUInt32 size)
-    {
-        ViUInt32 count = 0;
-        must(
-            viWrite(m_session, reinterpret_cast<ViConstBuf>(Query.data()), static_cast<ViUInt32>(Query.size()), &count),
-            "viWrite");
-        must(viRead(m_session, reinterpret_cast<ViPBuf>(answer), size, &count), "viRead");
-        return count;
-    }
-
-    void write(const std::string &message)
-    {
-        ViUInt32 count = 0;
-        must(viWrite(m_session, reinterpret_cast<ViConstBuf>(message.data()), static_cast<ViUInt32>(message.size()),
-                     &count),
-             "viWrite");
-    }
-
-    /// Reads exactly @p size bytes.
-    void readAll(char *data, ViUInt32 size)
-    {
-        ViUInt32 got = 0;
-        while (got < size) {
-            ViUInt32 count = 0;
-            must(viRead(m_session, reinterpret_cast<ViPBuf>(data + got), size - got, &count), "viRead");
-            got += count;
-        }
-    }
-
-    void terminationCharacter(bool enabled)
-    {
-        must(viSetAttribute(m_session, VI_ATTR_TERMCHAR_EN, enabled ? VI_TRUE : VI_FALSE), "termination character");
-    }
-
-private:
-    ViSession m_manager = VI_NULL;
-    ViSession m_session = VI_NULL;
+struct Side {
+    const char *name;
+    std::function<void()> call;
 };
 
-void bareSocketQuery(benchmark::State &state)
+void expect(bool condition, const char *what)
 {
-    bench::BareSocket socket(simulator->socketPort());
+    if (condition)
+        return;
+    std::fprintf(stderr, "%s\n", what);
+    std::exit(1);
+}
+
+void measureQueries(Measurement &measurement, const BenchSimulator &simulator, std::size_t rounds)
+{
     char answer[1024];
-    for (auto _ : state)
-        benchmark::DoNotOptimize(socket.query(Query, answer, sizeof answer));
-    state.SetItemsProcessed(state.iterations());
-}
+    BareEcho echo;
+    BareSocket bareSocket(simulator.socketPort());
+    BareHislip bareHislip(simulator.hislipPort());
+    BareVxi11 bareVxi11(simulator.portmapperPort());
+    VisaClient socket(resourceOf(simulator, Protocol::Socket), Protocol::Socket);
+    VisaClient hislip(resourceOf(simulator, Protocol::Hislip), Protocol::Hislip);
+    VisaClient vxi11(resourceOf(simulator, Protocol::Vxi11), Protocol::Vxi11);
 
-void bareHislipQuery(benchmark::State &state)
-{
-    bench::BareHislip hislip(simulator->hislipPort());
-    char answer[1024];
-    for (auto _ : state)
-        benchmark::DoNotOptimize(hislip.query(Query, answer, sizeof answer));
-    state.SetItemsProcessed(state.iterations());
-}
-
-void bareVxi11Query(benchmark::State &state)
-{
-    bench::BareVxi11 vxi11(simulator->portmapperPort());
-    char answer[1024];
-    for (auto _ : state)
-        benchmark::DoNotOptimize(vxi11.query(Query, answer, sizeof answer));
-    state.SetItemsProcessed(state.iterations());
-}
-
-void kyvisaQuery(benchmark::State &state, Protocol protocol)
-{
-    Session session(protocol);
-    char answer[1024];
-    for (auto _ : state)
-        benchmark::DoNotOptimize(session.query(answer, sizeof answer));
-    state.SetItemsProcessed(state.iterations());
-}
-
-void bareBlockWrite(benchmark::State &state)
-{
-    bench::BareCopy copy(BlockSize);
-    const std::vector<char> data(BlockSize, 'x');
-    for (auto _ : state)
-        copy.write(data.data());
-    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * BlockSize));
-}
-
-void bareBlockRead(benchmark::State &state)
-{
-    bench::BareCopy copy(BlockSize);
-    std::vector<char> data(BlockSize);
-    for (auto _ : state)
-        copy.read(data.data());
-    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * BlockSize));
+    const std::size_t length = bareSocket.query(Query, answer, sizeof answer);
+    const auto same = [&](std::size_t got) { expect(got == length, "the clients got different answers"); };
+    const Side sides[] = {
+        {"ping", [&] { echo.ping(); }},
+        {"socket/bare", [&] { same(bareSocket.query(Query, answer, sizeof answer)); }},
+        {"socket/kyvisa", [&] { same(socket.query(answer, sizeof answer)); }},
+        {"hislip/bare", [&] { same(bareHislip.query(Query, answer, sizeof answer)); }},
+        {"hislip/kyvisa", [&] { same(hislip.query(answer, sizeof answer)); }},
+        {"vxi11/bare", [&] { same(bareVxi11.query(Query, answer, sizeof answer)); }},
+        {"vxi11/kyvisa", [&] { same(vxi11.query(answer, sizeof answer)); }},
+    };
+    for (std::size_t round = 0; round < rounds; ++round)
+        for (const Side &side : sides)
+            measurement.add(side.name, timeEach(WarmUp, QueriesOfABatch, side.call));
 }
 
 std::string blockMessage()
@@ -165,66 +74,58 @@ std::string blockMessage()
     return message;
 }
 
-void kyvisaBlockWrite(benchmark::State &state, Protocol protocol)
+void measureBlocks(Measurement &measurement, const BenchSimulator &simulator, std::size_t rounds)
 {
-    Session session(protocol);
-    const std::string message = blockMessage();
-    char answer[8];
-    for (auto _ : state) {
-        session.write(message);
-        // The answer shows that the instrument has taken the block.
-        session.write("*OPC?\n");
-        session.readAll(answer, 2);
-    }
-    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * BlockSize));
-}
+    BareCopy copy(BlockSize);
+    VisaClient socket(resourceOf(simulator, Protocol::Socket), Protocol::Socket);
+    VisaClient hislip(resourceOf(simulator, Protocol::Hislip), Protocol::Hislip);
 
-void kyvisaBlockRead(benchmark::State &state, Protocol protocol)
-{
-    Session session(protocol);
-    session.write(blockMessage());
-    const std::size_t answerSize = 10 + BlockSize + 1; // "#8" and eight digits, the bytes, the line feed
-    std::vector<char> answer(answerSize);
-    if (protocol == Protocol::Socket)
-        session.terminationCharacter(false);
-    for (auto _ : state) {
-        session.write("MMEM:DATA? \"bench\"\n");
-        session.readAll(answer.data(), static_cast<ViUInt32>(answerSize));
-    }
-    if (std::memcmp(answer.data(), "#867108864x", 11) != 0 || answer.back() != '\n')
-        state.SkipWithError("not the block that was written");
-    state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * BlockSize));
+    const std::string message = blockMessage();
+    std::vector<char> answer(10 + BlockSize + 1); // "#8" and eight digits, the bytes, the line feed
+    const auto write = [&](VisaClient &client) {
+        client.write(message);
+        // The answer shows that the instrument has taken the block.
+        client.write("*OPC?\n");
+        client.readAll(answer.data(), 2);
+    };
+    const auto read = [&](VisaClient &client) {
+        client.write("MMEM:DATA? \"bench\"\n");
+        client.readAll(answer.data(), static_cast<ViUInt32>(answer.size()));
+    };
+    const auto readSocket = [&] {
+        socket.terminationCharacter(false);
+        read(socket);
+        socket.terminationCharacter(true);
+    };
+    const Side sides[] = {
+        {"blockWrite/bare", [&] { copy.write(message.data()); }},
+        {"blockWrite/socket", [&] { write(socket); }},
+        {"blockWrite/hislip", [&] { write(hislip); }},
+        {"blockRead/bare", [&] { copy.read(answer.data()); }},
+        {"blockRead/socket", readSocket},
+        {"blockRead/hislip", [&] { read(hislip); }},
+    };
+    for (std::size_t round = 0; round <= rounds; ++round)
+        for (const Side &side : sides) {
+            const std::vector<double> batch = timeEach(0, 1, side.call);
+            if (round > 0) // the first one touches the memory
+                measurement.add(side.name, batch);
+        }
+    expect(std::memcmp(answer.data(), "#867108864x", 11) == 0 && answer.back() == '\n',
+           "not the block that was written");
 }
 
 } // namespace
 
-BENCHMARK(bareSocketQuery)->UseRealTime();
-BENCHMARK_CAPTURE(kyvisaQuery, socket, Protocol::Socket)->UseRealTime();
-BENCHMARK(bareHislipQuery)->UseRealTime();
-BENCHMARK_CAPTURE(kyvisaQuery, hislip, Protocol::Hislip)->UseRealTime();
-BENCHMARK(bareVxi11Query)->UseRealTime();
-BENCHMARK_CAPTURE(kyvisaQuery, vxi11, Protocol::Vxi11)->UseRealTime();
-BENCHMARK(bareBlockWrite)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockWrite, socket, Protocol::Socket)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockWrite, hislip, Protocol::Hislip)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK(bareBlockRead)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockRead, socket, Protocol::Socket)->UseRealTime()->Unit(benchmark::kMillisecond);
-BENCHMARK_CAPTURE(kyvisaBlockRead, hislip, Protocol::Hislip)->UseRealTime()->Unit(benchmark::kMillisecond);
-
 int main(int argc, char **argv)
 {
     // Both ends on one core: unpinned round trips are bimodal, by where the scheduler puts the two processes.
-    cpu_set_t cores;
-    CPU_ZERO(&cores);
-    CPU_SET(0, &cores);
-    sched_setaffinity(0, sizeof cores, &cores);
-
-    bench::BenchSimulator onTheSameCore;
-    simulator = &onTheSameCore;
-    ::setenv("KYVISA_PORTMAPPER_PORT", std::to_string(onTheSameCore.portmapperPort()).c_str(), 1);
-    benchmark::Initialize(&argc, argv);
-    if (benchmark::ReportUnrecognizedArguments(argc, argv))
-        return 2;
-    benchmark::RunSpecifiedBenchmarks();
+    runOn(0);
+    const BenchSimulator simulator;
+    ::setenv("KYVISA_PORTMAPPER_PORT", std::to_string(simulator.portmapperPort()).c_str(), 1);
+    Measurement measurement;
+    measureQueries(measurement, simulator, numberOption(argc, argv, "--rounds", 200));
+    measureBlocks(measurement, simulator, numberOption(argc, argv, "--block-rounds", 15));
+    measurement.print();
     return 0;
 }

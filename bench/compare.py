@@ -1,110 +1,134 @@
 #!/usr/bin/env python3
-"""Runs the benchmarks, forms a ratio for each row, and compares it with its target.
+"""Runs the benchmarks, forms a figure for each row, and compares it with its target.
 
-Both sides of a row are measured in the same run, repetitions of all benchmarks interleaved at random; a row's figure is formed
-from the medians. Prints a table, writes bench.json, and ends with status 1 when a row misses its target.
+Both sides of a row are measured in the same run, by turns. Prints a table, writes a JSON file, and ends with status 1 when a row misses its
+target or its rival is slower than it ought to be.
 
-Usage: compare.py FOLDER_OF_THE_PROGRAMS [--repetitions N] [--json FILE]
+Usage: compare.py FOLDER_OF_THE_PROGRAMS [--json FILE] [--record PAGE] [--note TEXT] [--quick] [--only PART[,PART...]]
 """
 import argparse
 import json
 import pathlib
-import statistics
 import subprocess
 import sys
 
+sys.dont_write_bytecode = True
+import figures
+import report
+
+PARTS = ("transport", "strangers", "log", "window", "start", "growth")
+LONGEST = 300  # seconds that one program may take
+
 parser = argparse.ArgumentParser()
 parser.add_argument("programs", type=pathlib.Path)
-parser.add_argument("--repetitions", type=int, default=9)
 parser.add_argument("--json", type=pathlib.Path)
+parser.add_argument("--record", type=pathlib.Path, help="a page whose figures are replaced by those of this run")
+parser.add_argument("--note", default="a shared two-core machine", help="what the page says about the machine")
+parser.add_argument("--quick", action="store_true", help="short runs, for development")
+parser.add_argument("--only", default=",".join(PARTS), help="parts of the run, of " + ", ".join(PARTS))
 options = parser.parse_args()
+rows = report.Rows()
 
 
-def measure(program):
-    """Nanoseconds of every repetition, and the counters, by benchmark."""
-    run = subprocess.run(
-        [options.programs / program, "--benchmark_format=json", f"--benchmark_repetitions={options.repetitions}",
-         "--benchmark_enable_random_interleaving=true", "--benchmark_min_time=0.3"],
-        capture_output=True, text=True, check=False)
+def measure(program, *arguments):
+    """What one program measured: series and values."""
+    script = pathlib.Path(__file__).with_name(program)
+    command = [script, options.programs] if script.exists() else [options.programs / program]
+    print(f"-- {program}", file=sys.stderr)
+    try:
+        run = subprocess.run([*command, *map(str, arguments)], capture_output=True, text=True, check=False, timeout=LONGEST)
+    except subprocess.TimeoutExpired:
+        sys.exit(f"{program} did not end within {LONGEST} s")
     if run.returncode != 0:
         sys.exit(f"{program} ended with status {run.returncode}: {run.stderr[-2000:]}")
-    unit = {"ns": 1, "us": 1e3, "ms": 1e6, "s": 1e9}
-    times, counters = {}, {}
-    for entry in json.loads(run.stdout)["benchmarks"]:
-        if entry["run_type"] != "iteration":
-            continue
-        if entry.get("error_occurred"):
-            sys.exit(f"{program}: {entry['name']}: {entry['error_message']}")
-        name = entry["name"].split("/real_time")[0].split("/manual_time")[0].split("/iterations")[0]
-        times.setdefault(name, []).append(entry["real_time"] * unit[entry["time_unit"]])
-        counters.setdefault(name, []).append(entry.get("allocations", 0))
-    return times, counters
+    result = json.loads(run.stdout)
+    return result["series"], result["values"]
 
 
-def median(values):
-    return statistics.median(values)
+def quick(few, many):
+    return few if options.quick else many
 
 
-rows = []
+def transport():
+    series, _ = measure("bench-transport", "--rounds", quick(30, 200), "--block-rounds", quick(5, 15))
+    rows.ping = figures.summary(series["ping"])
+    for kind, name in (("socket", "raw socket"), ("hislip", "HiSLIP"), ("vxi11", "VXI-11")):
+        rival = f"{kind}/bare"
+        rows.at_least(f"*IDN? query, {name}, against a bare client", series, f"{kind}/kyvisa", rival, 0.85,
+                      gate=figures.gate(kind, series[rival], series["ping"]))
+    for direction in ("Write", "Read"):
+        for kind in ("socket", "hislip"):
+            rows.at_least(f"64 MiB block {direction.lower()}, {kind}, against a bare copy", series, f"block{direction}/{kind}",
+                          f"block{direction}/bare", 0.8)
 
 
-def row(what, ours, rival, figure, target, good, unit=""):
-    rows.append({"row": what, "ours_ns": ours, "rival_ns": rival, "figure": figure, "unit": unit, "target": target, "met": good})
+def strangers():
+    series, _ = measure("strangers.py", "--rounds", quick(3, 15))
+    for kind, name in (("socket", "raw socket"), ("vxi11", "VXI-11")):
+        rows.at_least(f"*IDN? query, {name}, against lxi benchmark", series, f"{kind}/kyvisa", f"{kind}/lxi", 1.0)
+        rows.at_least(f"*IDN? query, {name}, against PyVISA in pure Python", series, f"{kind}/kyvisa", f"{kind}/pyvisa-py", 3.0)
 
 
-def at_least(what, times, ours, rival, target):
-    """Rate of ours over rate of the rival."""
-    ratio = median(times[rival]) / median(times[ours])
-    row(what, times[ours], times[rival], ratio, f">= {target}", ratio >= target)
+def log():
+    series, values = measure("bench-log", "--rounds", quick(10, 60))
+
+    def above(what, ours, limit, text, rival):
+        rows.at_most(what, figures.difference(series[ours], series["bareCall"]), limit, "ns", figures.summary(series[ours]),
+                     figures.summary(series[rival]), text)
+
+    above("logged call above the bare call, both sinks on", "loggedCall/bothSinks", 2000, "<= 2000", "bareCall")
+    limit = figures.percentile(figures.samples(series["twoClockReadings"]), 50) + 20
+    above("logged call above the bare call, logging off", "loggedCall/off", limit, f"<= {limit:.0f} (two clock readings + 20)", "twoClockReadings")
+    rows.at_least("one line into both sinks, against spdlog asynchronous", series, "oneLine", "spdlogLine", 1.0, strictly=True)
+    rows.at_most("allocations a line", values["allocationsOfALine"], 0, "")
 
 
-times, _ = measure("bench-transport")
-at_least("*IDN? query, raw socket, against a bare client", times, "kyvisaQuery/socket", "bareSocketQuery", 0.85)
-at_least("*IDN? query, HiSLIP, against a bare client", times, "kyvisaQuery/hislip", "bareHislipQuery", 0.85)
-at_least("*IDN? query, VXI-11, against a bare client", times, "kyvisaQuery/vxi11", "bareVxi11Query", 0.85)
-for direction in ("Write", "Read"):
-    for protocol in ("socket", "hislip"):
-        at_least(f"64 MiB block {direction.lower()}, {protocol}, against a bare copy", times,
-                 f"kyvisaBlock{direction}/{protocol}", f"bareBlock{direction}", 0.8)
-
-strangers = subprocess.run([pathlib.Path(__file__).with_name("strangers.py"), options.programs, "--repetitions", str(options.repetitions)],
-                           capture_output=True, text=True, check=False)
-if strangers.returncode != 0:
-    sys.exit(f"strangers.py ended with status {strangers.returncode}: {strangers.stderr[-2000:]}")
-times = json.loads(strangers.stdout)
-at_least("*IDN? query, VXI-11, against lxi benchmark", times, "kyvisa", "lxi", 1.0)
-at_least("*IDN? query, VXI-11, against PyVISA in pure Python", times, "kyvisa", "pyvisa-py", 3.0)
-
-if (options.programs / "bench-log").exists():
-    times, counters = measure("bench-log")
-    above = median(times["loggedCall/bothSinks"]) - median(times["bareCall"])
-    row("logged call above the bare call, both sinks on", times["loggedCall/bothSinks"], times["bareCall"], above, "<= 2000 ns",
-        above <= 2000, "ns")
-    above = median(times["loggedCall/off"]) - median(times["bareCall"])
-    limit = median(times["twoClockReadings"]) + 20
-    row("logged call above the bare call, logging off", times["loggedCall/off"], times["twoClockReadings"], above,
-        f"<= {limit:.0f} ns (two clock readings + 20)", above <= limit, "ns")
-    at_least("one line into both sinks, against spdlog asynchronous", times, "oneLine", "spdlogLine", 1.0)
-    allocated = max(counters["oneLine"])
-    row("allocations a line", times["oneLine"], times["spdlogLine"], allocated, "0", allocated == 0)
+def window():
+    _, values = measure("bench-window", "--seconds", quick(3, 10))
+    for kind, what in (("log", "20,000 lines a second straight into the log"), ("test", "a test's calls at full speed"),
+                       ("pipeline", "the window's requests at full speed")):
+        rows.below(f"live view: share of the window's thread, {what}", 100 * values[f"{kind}/share"], 25, "%",
+                   lines_a_second=values[f"{kind}/linesASecond"])
+    wanted = 0.95 * 20000
+    rows.add("live view: lines a second that came into the log", values["log/linesASecond"], "1/s", f">= {wanted:.0f}",
+             values["log/linesASecond"] >= wanted)
 
 
-def readable(nanoseconds):
-    for limit, factor, unit in ((1e3, 1, "ns"), (1e6, 1e3, "us"), (1e9, 1e6, "ms")):
-        if nanoseconds < limit:
-            return f"{nanoseconds / factor:.1f} {unit}"
-    return f"{nanoseconds / 1e9:.2f} s"
+def start():
+    series, values = measure("programs.py", "--rounds", quick(5, 20))
+    ratio = 1 / figures.rate_ratio(series["start/tester"], series["start/empty"])
+    rows.at_most("start to the first painted window, against an empty Qt Widgets program", ratio, 2.0, "x",
+                 figures.summary(series["start/tester"]), figures.summary(series["start/empty"]), text="<= 2")
+    rows.below("memory of the idle tester above the empty program", values["memory/tester"] - values["memory/empty"], 40, "MiB",
+               tester=values["memory/tester"], empty=values["memory/empty"])
 
 
-def spread(values):
-    ordered = sorted(values)
-    return f"{readable(median(ordered))} ({readable(ordered[0])} .. {readable(ordered[-1])})"
+def growth():
+    series, _ = measure("bench-growth", *(["--quick"] if options.quick else []))
+    for what, title, unit in (("lines", "log lines into both sinks, until they stand in the file", "lines"),
+                              ("sessions", "one query on each of many open sessions", "sessions"),
+                              ("opens", "opening and closing many sessions", "sessions"),
+                              ("blockWrite", "block written over HiSLIP", "bytes"), ("blockRead", "block read over HiSLIP", "bytes"),
+                              ("resources", "resources found and fetched one by one", "resources")):
+        # The least of each size: what else the machine does adds to a cost, and adds more to long ones.
+        points = [(int(name.split("/")[1]), min(figures.samples(batches))) for name, batches in series.items() if name.split("/")[0] == what]
+        rows.growth(title, sorted(points), unit)
 
 
-print(f"{'row':58} {'ours, median (min .. max)':36} {'rival, median (min .. max)':36} {'figure':>10}  target")
-for r in rows:
-    mark = "ok" if r["met"] else "MISSED"
-    print(f"{r['row']:58} {spread(r['ours_ns']):36} {spread(r['rival_ns']):36} {r['figure']:>7.2f} {r['unit']:2}  {r['target']}  {mark}")
+for part in options.only.split(","):
+    if part not in PARTS:
+        parser.error(f"no such part: {part}")
+    globals()[part]()
+
+machine = report.machine(options.note)
+print(f"{machine}\n")
+print(rows.table())
+print(rows.growth_table(), end="")
+if hasattr(rows, "ping"):
+    print(f"a plain round trip on the same core: {report.percentiles(rows.ping)}")
 if options.json:
-    options.json.write_text(json.dumps({"repetitions": options.repetitions, "rows": rows}, indent=1) + "\n")
-sys.exit(0 if all(r["met"] for r in rows) else 1)
+    options.json.write_text(rows.json(machine), encoding="utf-8")
+if options.record:
+    page = options.record.read_text(encoding="utf-8")
+    options.record.write_text(report.replaced(page, rows.markdown(machine)), encoding="utf-8")
+sys.exit(0 if rows.all_met() else 1)

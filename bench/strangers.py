@@ -1,10 +1,10 @@
 #!/usr/bin/python3
-"""Measures VXI-11 queries of libkyvisa and of other makers' clients on one simulator, all on one core.
+"""Measures queries of libkyvisa and of other makers' clients on one simulator, all on one core.
 
-The simulator needs port 111, so this runs in a network of its own. Rounds of all clients take turns. Prints JSON: nanoseconds a
-query of every round, by client.
+VXI-11 clients insist on portmapper 111, so this runs in a network of its own. Rounds of all clients take turns. Prints JSON like
+the other benchmark programs: nanoseconds a query, one sample a round.
 
-Usage: strangers.py FOLDER_OF_THE_PROGRAMS [--repetitions N]
+Usage: strangers.py FOLDER_OF_THE_PROGRAMS [--rounds N]
 """
 import argparse
 import json
@@ -15,12 +15,11 @@ import subprocess
 import sys
 import time
 
-RESOURCE = "TCPIP::127.0.0.1::inst0::INSTR"
-COUNT = 4000
+COUNT = 1500
 
 parser = argparse.ArgumentParser()
 parser.add_argument("programs", type=pathlib.Path)
-parser.add_argument("--repetitions", type=int, default=9)
+parser.add_argument("--rounds", type=int, default=15)
 parser.add_argument("--inside", action="store_true")
 options = parser.parse_args()
 
@@ -32,19 +31,19 @@ os.sched_setaffinity(0, {0})
 subprocess.run(["ip", "link", "set", "lo", "up"], check=True)
 
 
-def ours():
-    run = subprocess.run([options.programs / "bench-query", RESOURCE, str(COUNT)], capture_output=True, text=True, check=True, timeout=120)
+def ours(resource):
+    run = subprocess.run([options.programs / "bench-query", resource, str(COUNT)], capture_output=True, text=True, check=True, timeout=120)
     return float(run.stdout)
 
 
-def lxi():
-    run = subprocess.run(["lxi", "benchmark", "--address", "127.0.0.1", "--count", str(COUNT)], capture_output=True, text=True,
+def lxi(*more):
+    run = subprocess.run(["lxi", "benchmark", "--address", "127.0.0.1", "--count", str(COUNT), *more], capture_output=True, text=True,
                          check=True, timeout=120)
     return 1e9 / float(re.search(r"Result: (\S+) requests/second", run.stdout)[1])
 
 
-def pure_python():
-    count = COUNT // 4
+def pure_python(instrument):
+    count = COUNT // 3
     begin = time.perf_counter()
     for _ in range(count):
         instrument.write("*IDN?")
@@ -52,20 +51,34 @@ def pure_python():
     return (time.perf_counter() - begin) * 1e9 / count
 
 
-simulator = subprocess.Popen([options.programs / "KyVisaSimulator", "--vxi11", "0", "--portmapper", "111"], stdout=subprocess.PIPE, text=True)
+simulator = subprocess.Popen([options.programs / "KyVisaSimulator", "--vxi11", "0", "--portmapper", "111", "--socket", "0"],
+                             stdout=subprocess.PIPE, text=True)
 try:
-    while simulator.stdout.readline().strip() not in ("ready", ""):
-        pass
+    resources = {}
+    while (line := simulator.stdout.readline().strip()) not in ("ready", ""):
+        resources[line.split()[0]] = line.split()[-1]
     import pyvisa
 
-    instrument = pyvisa.ResourceManager("@py").open_resource(RESOURCE, timeout=10000)
-    times = {"kyvisa": [], "lxi": [], "pyvisa-py": []}
-    for _ in range(options.repetitions):
-        times["kyvisa"].append(ours())
-        times["lxi"].append(lxi())
-        times["pyvisa-py"].append(pure_python())
-    instrument.close()
-    print(json.dumps(times))
+    manager = pyvisa.ResourceManager("@py")
+    termination = {"read_termination": "\n", "write_termination": "\n", "timeout": 10000}
+    by_vxi11 = manager.open_resource(resources["vxi11"], timeout=10000)
+    by_socket = manager.open_resource(resources["socket"], **termination)
+    port = re.search(r"::(\d+)::SOCKET", resources["socket"])[1]
+    clients = {
+        "vxi11/kyvisa": lambda: ours(resources["vxi11"]),
+        "vxi11/lxi": lxi,
+        "vxi11/pyvisa-py": lambda: pure_python(by_vxi11),
+        "socket/kyvisa": lambda: ours(resources["socket"]),
+        "socket/lxi": lambda: lxi("--raw", "--port", port),
+        "socket/pyvisa-py": lambda: pure_python(by_socket),
+    }
+    series = {name: [] for name in clients}
+    for _ in range(options.rounds):
+        for name, query in clients.items():
+            series[name].append([query()])
+    by_vxi11.close()
+    by_socket.close()
+    print(json.dumps({"series": series, "values": {}}))
 finally:
     simulator.terminate()
     simulator.wait(60)
