@@ -1,6 +1,6 @@
 // Fifty clients on one simulator. Usage: soak SECONDS [RECORD_FILE]. Status 1 when anything was lost, crossed, grown or left busy.
-#include "soak/ProcessFigures.h"
 #include "soak/SoakClients.h"
+#include "support/ProcessFigures.h"
 #include "support/SimulatorProcess.h"
 
 #include <algorithm>
@@ -20,6 +20,8 @@
 #include <vector>
 
 using namespace soak;
+using test::figuresOf;
+using test::ProcessFigures;
 using namespace std::chrono_literals;
 using Clock = std::chrono::steady_clock;
 

@@ -1,4 +1,4 @@
-#include "soak/ProcessFigures.h"
+#include "support/ProcessFigures.h"
 
 #include <unistd.h>
 
@@ -7,7 +7,7 @@
 #include <sstream>
 #include <string>
 
-namespace soak
+namespace test
 {
 namespace
 {
@@ -52,4 +52,4 @@ ProcessFigures figuresOf(pid_t process)
     return figures;
 }
 
-} // namespace soak
+} // namespace test

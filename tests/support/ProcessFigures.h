@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <sys/types.h>
 
-namespace soak
+namespace test
 {
 
 /// What /proc says of a process at one moment.
@@ -16,4 +16,4 @@ struct ProcessFigures {
 
 ProcessFigures figuresOf(pid_t process);
 
-} // namespace soak
+} // namespace test
