@@ -7,6 +7,7 @@
  */
 #include <visa.h>
 
+#include <locale.h>
 #include <stdio.h>
 #include <stdlib.h>
 
@@ -35,6 +36,7 @@ int main(int argc, char **argv)
     ViUInt32 count;
     char resource[VI_FIND_BUFLEN];
 
+    setlocale(LC_ALL, ""); /* the user's: names and numbers of the library do not depend on it */
     if (viOpenDefaultRM(&manager) < VI_SUCCESS)
         return 1;
     if (argc > 2)

@@ -1,7 +1,7 @@
 #!/usr/bin/python3
 """What viFindRsrc finds on two networks with simulated instruments, odd hosts and silence.
 
-Usage: discovery.py SIMULATOR FIND_PROGRAM. Status 1 when something was not as it should be.
+Usage: discovery.py SIMULATOR FIND_PROGRAM LOCALES. LOCALES is a folder with de_DE.UTF-8. Status 1 when something was not as it should be.
 """
 import os
 import subprocess
@@ -14,7 +14,7 @@ from netlab import Host, Switch, enter  # noqa: E402
 enter()
 ZEROCONF = subprocess.run(["/usr/bin/python3", "-c", "import zeroconf; print(zeroconf.__version__)"], check=True,
                           capture_output=True, text=True).stdout.strip()
-SIMULATOR, FIND = sys.argv[1:3]
+SIMULATOR, FIND, LOCALES = sys.argv[1:4]
 MDNS, VXI11, BOTH, NONE = 4, 2, 6, 0
 findings = []
 
@@ -26,9 +26,9 @@ def expect(what, got, wanted):
         findings.append(what)
 
 
-def find(expression="TCPIP?*", methods=BOTH, milliseconds=3000):
+def find(expression="TCPIP?*", methods=BOTH, milliseconds=3000, **more_environment):
     """Resources in their order with their texts, and the seconds that it took."""
-    environment = dict(os.environ, XDG_CONFIG_HOME="/nonexistent", KYVISA_CONFIG="/nonexistent")
+    environment = dict(os.environ, XDG_CONFIG_HOME="/nonexistent", KYVISA_CONFIG="/nonexistent", **more_environment)
     begin = time.monotonic()
     result = subprocess.run([FIND, expression, str(methods), str(milliseconds)], capture_output=True, text=True,
                             timeout=60, env=environment)
@@ -87,6 +87,9 @@ found, _ = find(methods=VXI11)
 wanted = [f"TCPIP0::{host.address}::inst0::INSTR" for host in hosts]
 expect("found by VXI-11, in the order of the addresses", [name for name in found if "inst0" in name], wanted)
 expect("texts of the document", found.get(wanted[0], {}).get("manufacturer"), "Oltrava")
+english, _ = find(methods=VXI11)
+german, _ = find(methods=VXI11, LOCPATH=LOCALES, LC_ALL="de_DE.UTF-8")
+expect("found by a program that speaks German", german, english)
 everything = [name for host in hosts for name in (f"TCPIP0::{host.address}::hislip0::INSTR", f"TCPIP0::{host.address}::inst0::INSTR")]
 found, _ = find(methods=MDNS)
 expect("found by mDNS, from the simulators' own announcements", list(found), everything)
