@@ -30,7 +30,9 @@ class Switch:
         self.number = number
         self.name = f"switch{number}"
         self.hosts = 0
-        ip("link", "add", self.name, "type", "bridge")
+        # An address of its own: otherwise it has the lowest of its hosts', which changes when another one comes, and those that
+        # know the old one send into the void for half a minute.
+        ip("link", "add", self.name, "address", f"02:00:00:00:00:{number:02x}", "type", "bridge")
         ip("addr", "add", f"10.{number}.0.1/24", "broadcast", "+", "dev", self.name)
         ip("link", "set", self.name, "up")
 
