@@ -141,17 +141,21 @@ ViStatus FormattedIo::setBuffer(ViUInt16 mask, ViUInt32 size)
     constexpr ViUInt16 Known = VI_READ_BUF | VI_WRITE_BUF | VI_IO_IN_BUF | VI_IO_OUT_BUF;
     if (mask == 0 || (mask & ~Known) != 0)
         return VI_ERROR_INV_MASK;
-    if ((mask & SystemMask) != 0 || size == 0 || size > LargestBuffer)
+    if (size == 0 || size > LargestBuffer)
         return VI_WARN_NSUP_BUF;
     return inTurn([&](format::MessageChannel &channel) -> ViStatus {
         if ((mask & VI_READ_BUF) != 0) {
             m_buffers.input.resize(size);
             m_session.setBufferSize(VI_ATTR_RD_BUF_SIZE, size);
         }
-        if ((mask & VI_WRITE_BUF) == 0)
-            return VI_SUCCESS;
-        m_session.setBufferSize(VI_ATTR_WR_BUF_SIZE, size);
-        return m_buffers.output.resize(size, channel);
+        ViStatus status = VI_SUCCESS;
+        if ((mask & VI_WRITE_BUF) != 0) {
+            m_session.setBufferSize(VI_ATTR_WR_BUF_SIZE, size);
+            status = m_buffers.output.resize(size, channel);
+        }
+        if (status >= VI_SUCCESS && (mask & SystemMask) != 0)
+            status = m_session.resizeLine(mask & SystemMask, size);
+        return status;
     });
 }
 
@@ -159,7 +163,8 @@ ViStatus FormattedIo::flush(ViUInt16 mask)
 {
     const auto contradictory = [&](ViUInt16 one, ViUInt16 other) { return (mask & one) != 0 && (mask & other) != 0; };
     if (mask == 0 || (mask & ~(FormattedMask | SystemMask)) != 0 || contradictory(VI_READ_BUF, VI_READ_BUF_DISCARD) ||
-        contradictory(VI_WRITE_BUF, VI_WRITE_BUF_DISCARD))
+        contradictory(VI_WRITE_BUF, VI_WRITE_BUF_DISCARD) || contradictory(VI_IO_IN_BUF, VI_IO_IN_BUF_DISCARD) ||
+        contradictory(VI_IO_OUT_BUF, VI_IO_OUT_BUF_DISCARD))
         return VI_ERROR_INV_MASK;
     return inTurn([&](format::MessageChannel &channel) -> ViStatus {
         if ((mask & VI_WRITE_BUF_DISCARD) != 0)

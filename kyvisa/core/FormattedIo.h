@@ -31,8 +31,9 @@ public:
     ViStatus write(std::span<const std::byte> data, std::size_t &count);
     ViStatus read(std::span<std::byte> data, std::size_t &count);
 
-    /// @param mask VI_READ_BUF and VI_WRITE_BUF in any combination. @param size in bytes, 1 to 64 MiB.
-    /// @return VI_WARN_NSUP_BUF for another size, or for the buffers of the operating system.
+    /// @param mask VI_READ_BUF, VI_WRITE_BUF, VI_IO_IN_BUF and VI_IO_OUT_BUF in any combination.
+    /// @param size in bytes, 1 to 64 MiB.
+    /// @return VI_WARN_NSUP_BUF for another size, and where the system's buffers cannot be set.
     ViStatus setBuffer(ViUInt16 mask, ViUInt32 size);
     /// @return VI_ERROR_INV_MASK for unknown or contradictory bits.
     ViStatus flush(ViUInt16 mask);

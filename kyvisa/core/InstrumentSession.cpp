@@ -315,6 +315,11 @@ ViStatus InstrumentSession::flushLine(ViUInt16 mask)
                    [&](const os::WaitLimit &limit) { return m_transport->flushLine(mask, limit); });
 }
 
+ViStatus InstrumentSession::resizeLine(ViUInt16 mask, std::size_t size)
+{
+    return perform(operationDeadline(), [&](const os::WaitLimit &) { return m_transport->resizeLine(mask, size); });
+}
+
 ViStatus InstrumentSession::terminate(ViUInt16 degree, ViJobId job)
 {
     if (degree != VI_NULL)

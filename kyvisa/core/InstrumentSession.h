@@ -79,6 +79,8 @@ public:
     ViStatus passControl(ViUInt16 primary, ViUInt16 secondary);
     /// viFlush() of the system's buffers.
     ViStatus flushLine(ViUInt16 mask);
+    /// viSetBuf() of the system's buffers.
+    ViStatus resizeLine(ViUInt16 mask, std::size_t size);
     ViStatus terminate(ViUInt16 degree, ViJobId job);
 
     ViStatus lock(ViAccessMode type, ViUInt32 timeout, const ViChar *requestedKey, ViChar *accessKey);

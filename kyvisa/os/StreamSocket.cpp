@@ -167,6 +167,18 @@ bool StreamSocket::setNoDelay(bool on)
     return systemCalls().setsockopt(m_descriptor, IPPROTO_TCP, TCP_NODELAY, &value, sizeof value) == 0;
 }
 
+bool StreamSocket::setReceiveBuffer(std::size_t size)
+{
+    const int value = static_cast<int>(size);
+    return systemCalls().setsockopt(m_descriptor, SOL_SOCKET, SO_RCVBUF, &value, sizeof value) == 0;
+}
+
+bool StreamSocket::setSendBuffer(std::size_t size)
+{
+    const int value = static_cast<int>(size);
+    return systemCalls().setsockopt(m_descriptor, SOL_SOCKET, SO_SNDBUF, &value, sizeof value) == 0;
+}
+
 bool StreamSocket::setKeepAlive(bool on)
 {
     const int value = on ? 1 : 0;

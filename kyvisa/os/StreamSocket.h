@@ -55,6 +55,9 @@ public:
     /// From now on receive() may wait in the system. Where that cannot be had it goes on polling.
     void allowBriefWaits();
     bool setNoDelay(bool on);
+    /// Sizes of the system's buffers in bytes: what it rounds and limits is its own affair.
+    bool setReceiveBuffer(std::size_t size);
+    bool setSendBuffer(std::size_t size);
     /// Asks the peer for a sign of life after a minute of silence: firewalls forget idle connections after a few.
     bool setKeepAlive(bool on);
     /// The peer's address in numbers, or an empty text.

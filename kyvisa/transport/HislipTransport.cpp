@@ -115,13 +115,9 @@ ViStatus HislipTransport::readResponse(std::span<std::byte> buffer, const Transf
         if (status < VI_SUCCESS)
             return status;
         if (m_sync.payloadLeft() == 0) {
-            m_inMessage = false;
-            m_lastDeliveredId = m_messageId;
-            if (m_messageEnds) {
-                m_deliveredToReport = true;
-                if (!mode.suppressEnd)
-                    return VI_SUCCESS;
-            }
+            responseMessageTaken();
+            if (m_messageEnds && !mode.suppressEnd)
+                return VI_SUCCESS;
         }
         if (status == VI_SUCCESS_TERM_CHAR)
             return status;
@@ -130,6 +126,13 @@ ViStatus HislipTransport::readResponse(std::span<std::byte> buffer, const Transf
         if (limit.deadline.expired())
             return VI_ERROR_TMO;
     }
+}
+
+void HislipTransport::responseMessageTaken()
+{
+    m_inMessage = false;
+    m_lastDeliveredId = m_messageId;
+    m_deliveredToReport = m_deliveredToReport || m_messageEnds;
 }
 
 /// Moves payload until the message, the buffer or, where that counts, the termination character ends it.
@@ -273,6 +276,36 @@ ViStatus HislipTransport::readStatusByte(const TransferMode &, const os::WaitLim
     if (result >= VI_SUCCESS)
         status = reply.header.control;
     return checked(result);
+}
+
+/// Drops the responses that have arrived, and the rest of one that is still arriving, without waiting for any.
+ViStatus HislipTransport::flushLine(ViUInt16 mask, const os::WaitLimit &limit)
+{
+    if (!m_sync.isOpen())
+        return VI_ERROR_CONN_LOST;
+    if ((mask & (VI_IO_IN_BUF | VI_IO_IN_BUF_DISCARD)) == 0)
+        return VI_SUCCESS; // what was sent is the system's
+    const os::WaitLimit atOnce{os::Deadline::now(), limit.wakeup};
+    do {
+        if (!m_inMessage) {
+            std::size_t none = 0;
+            const ViStatus status = nextData(none, atOnce);
+            if (status < VI_SUCCESS)
+                return status == VI_ERROR_TMO ? VI_SUCCESS : status;
+        }
+        const IoResult result = m_sync.skipPayload(atOnce);
+        if (result != IoResult::Done) {
+            m_inMessage = false; // the next header comes behind what is left of it
+            return result == IoResult::TimedOut ? VI_SUCCESS : ended(result, limit);
+        }
+        responseMessageTaken();
+    } while (!limit.deadline.expired());
+    return VI_SUCCESS;
+}
+
+ViStatus HislipTransport::resizeLine(ViUInt16 mask, std::size_t size)
+{
+    return resizeBuffersOf(m_sync.socket(), mask, size);
 }
 
 ViStatus HislipTransport::trigger(const TransferMode &, const os::WaitLimit &limit)

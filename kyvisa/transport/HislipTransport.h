@@ -39,6 +39,8 @@ public:
     ViStatus clear(const os::WaitLimit &limit) override;
     ViStatus controlRemote(ViUInt16 mode, const os::WaitLimit &limit) override;
     ViStatus applyAttribute(ViAttr attribute, ViUInt64 value, const os::WaitLimit &limit) override;
+    ViStatus flushLine(ViUInt16 mask, const os::WaitLimit &limit) override;
+    ViStatus resizeLine(ViUInt16 mask, std::size_t size) override;
     ViStatus watchServiceRequests(std::function<void()> notify, const os::WaitLimit &limit) override;
     DeviceLocks deviceLocks() const override { return DeviceLocks::All; }
     ViStatus lockDevice(const std::string &key, std::chrono::milliseconds patience,
@@ -60,6 +62,7 @@ private:
                           std::size_t &count);
     bool lockedByAnother(const os::Wakeup &wakeup);
     ViStatus nextData(std::size_t &count, const os::WaitLimit &limit);
+    void responseMessageTaken();
     ViStatus deliver(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
                      std::size_t &count);
     ViStatus beforeSending(const os::WaitLimit &limit);

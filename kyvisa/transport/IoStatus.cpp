@@ -1,6 +1,7 @@
 #include "kyvisa/transport/IoStatus.h"
 
 #include "kyvisa/include/visa.h"
+#include "kyvisa/os/StreamSocket.h"
 
 namespace kyvisa
 {
@@ -34,6 +35,15 @@ ViStatus connectStatus(os::IoResult result, const os::WaitLimit &limit)
     default:
         return transferStatus(result, limit);
     }
+}
+
+ViStatus resizeBuffersOf(os::StreamSocket &socket, ViUInt16 mask, std::size_t size)
+{
+    if (!socket.isOpen())
+        return VI_ERROR_CONN_LOST;
+    const bool input = (mask & VI_IO_IN_BUF) == 0 || socket.setReceiveBuffer(size);
+    const bool output = (mask & VI_IO_OUT_BUF) == 0 || socket.setSendBuffer(size);
+    return input && output ? VI_SUCCESS : VI_WARN_NSUP_BUF;
 }
 
 } // namespace kyvisa

@@ -110,6 +110,11 @@ ViStatus SocketTransport::flushLine(ViUInt16 mask, const os::WaitLimit &limit)
     return dropInput(limit) ? VI_SUCCESS : VI_ERROR_CONN_LOST;
 }
 
+ViStatus SocketTransport::resizeLine(ViUInt16 mask, std::size_t size)
+{
+    return resizeBuffersOf(m_socket, mask, size);
+}
+
 ViStatus SocketTransport::clear(const os::WaitLimit &limit)
 {
     return dropInput(limit) ? VI_SUCCESS : VI_ERROR_CONN_LOST;

@@ -27,6 +27,7 @@ public:
     ViStatus clear(const os::WaitLimit &limit) override;
     ViStatus applyAttribute(ViAttr attribute, ViUInt64 value, const os::WaitLimit &limit) override;
     ViStatus flushLine(ViUInt16 mask, const os::WaitLimit &limit) override;
+    ViStatus resizeLine(ViUInt16 mask, std::size_t size) override;
     void close() override;
     void abandon() override;
 

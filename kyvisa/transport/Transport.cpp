@@ -30,6 +30,11 @@ ViStatus Transport::flushLine(ViUInt16, const os::WaitLimit &)
     return VI_SUCCESS;
 }
 
+ViStatus Transport::resizeLine(ViUInt16, std::size_t)
+{
+    return VI_WARN_NSUP_BUF;
+}
+
 ViStatus Transport::watchServiceRequests(std::function<void()>, const os::WaitLimit &)
 {
     return VI_ERROR_INV_EVENT;

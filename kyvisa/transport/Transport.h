@@ -68,6 +68,9 @@ public:
     virtual ViStatus readAttribute(ViAttr attribute, const os::WaitLimit &limit, ViUInt64 &value);
     /// viFlush() of the system's buffers. @param mask VI_IO_IN_BUF, VI_IO_OUT_BUF and their _DISCARD.
     virtual ViStatus flushLine(ViUInt16 mask, const os::WaitLimit &limit);
+    /// viSetBuf() of the system's buffers. @param mask VI_IO_IN_BUF and VI_IO_OUT_BUF. @param size in bytes, not 0.
+    /// @return VI_WARN_NSUP_BUF where their size is nobody's to set.
+    virtual ViStatus resizeLine(ViUInt16 mask, std::size_t size);
 
     /// What a session on a GPIB interface can do beside transfers; nullptr for everything else.
     virtual GpibController *gpibController() { return nullptr; }

@@ -136,7 +136,6 @@ TEST_P(Formatted, ChangesTheSizesOfItsBuffers)
     EXPECT_EQ(viQueryf(vi, "%s\n", "%T", "*ESE 1;*ESE?;:SYST:VERS?", text), VI_SUCCESS);
     EXPECT_STREQ(text, "1;1999.0\n");
     EXPECT_EQ(viSetBuf(vi, VI_READ_BUF, 0), VI_WARN_NSUP_BUF);
-    EXPECT_EQ(viSetBuf(vi, VI_IO_IN_BUF, 100), VI_WARN_NSUP_BUF);
     EXPECT_EQ(m_session.get<ViUInt32>(VI_ATTR_RD_BUF_SIZE), 10u);
 }
 
