@@ -4,6 +4,7 @@
   installed.py install BUILD STAGE          installs afresh
   installed.py files STAGE PREFIX LIST      exactly the files of LIST are there
   installed.py tester STAGE PREFIX          the window opens on the installed library, with its icon, and closes
+  installed.py session STAGE PREFIX         with mouse and keys, the window connects to the installed simulator and asks it
   installed.py pkg-config STAGE PREFIX SOURCES
                                             every installed example compiles, and SOURCES' query.c asks the installed simulator
   installed.py cmake STAGE PREFIX SOURCES   the same through find_package(KyVisa)
@@ -49,18 +50,17 @@ def library_folder(root):
 
 @contextlib.contextmanager
 def simulator(root, *options):
-    """The installed simulator; gives the resource string of its HiSLIP."""
-    with subprocess.Popen([root / "bin/KyVisaSimulator", "--hislip", "0", *options], env=CLEAN, stdout=subprocess.PIPE, text=True) as process:
-        try:
-            lines = []
-            while (line := process.stdout.readline().strip()) != "ready":
-                assert line, lines
-                lines.append(line)
-            yield lines[0].split()[-1]
-            process.terminate()
-            assert process.wait(PATIENCE) == 0
-        finally:
-            process.kill()
+    """The installed simulator; gives the resource string of its HiSLIP, and the file of what it says."""
+    with tempfile.NamedTemporaryFile("w") as said:
+        with subprocess.Popen([root / "bin/KyVisaSimulator", "--hislip", "0", *options], env=CLEAN, stdout=said) as process:
+            try:
+                said = pathlib.Path(said.name)
+                lines = wait_for("the simulator", lambda: (text := said.read_text()) and "ready" in text.split("\n") and text.split("\n"))
+                yield lines[0].split()[-1], said
+                process.terminate()
+                assert process.wait(PATIENCE) == 0
+            finally:
+                process.kill()
 
 
 def install(build, stage):
@@ -79,17 +79,17 @@ def files(root, listed):
     assert wanted - patterns
 
 
-def tester(root):
-    with tempfile.TemporaryDirectory() as home, VirtualDisplay() as display:
-        os.mkdir(f"{home}/Documents")
+@contextlib.contextmanager
+def open_window(root, home):
+    """The installed tester's window on a display of its own; closed at the end, with status 0."""
+    os.makedirs(f"{home}/Documents", exist_ok=True)
+    with VirtualDisplay() as display:
         environment = CLEAN | {"HOME": home, "DISPLAY": display.name, "QT_QPA_PLATFORM": "xcb", "XDG_RUNTIME_DIR": home, "LC_ALL": "C.UTF-8"}
         program = subprocess.Popen([root / "bin/KyVisaTester"], env=environment)
         try:
             # Whose library it is stands in the title.
             window = wait_for("the window", lambda: display.window("KyVisaTester 5.8.6 Visa from Oltrava (5.8.6)"))
-            used = set(re.findall(r"\S*/libkyvisa\.so", pathlib.Path(f"/proc/{program.pid}/maps").read_text()))
-            assert used == {str(library_folder(root) / "libkyvisa.so")}, used
-            assert sorted(display.icon_sizes(window)) == [32, 48, 64, 128], display.icon_sizes(window)
+            yield display, program.pid, window
             display.close(window)
             assert program.wait(PATIENCE) == 0
         finally:
@@ -97,8 +97,41 @@ def tester(root):
             program.wait()
 
 
+def tester(root):
+    with tempfile.TemporaryDirectory() as home, open_window(root, home) as (display, pid, window):
+        used = set(re.findall(r"\S*/libkyvisa\.so", pathlib.Path(f"/proc/{pid}/maps").read_text()))
+        assert used == {str((library_folder(root) / "libkyvisa.so").resolve())}, used
+        # The pictures reach the window manager some time after the window does.
+        wait_for("the icon", lambda: sorted(display.icon_sizes(window)) == [32, 48, 64, 128])
+
+
+def session(root):
+    with tempfile.TemporaryDirectory() as home, simulator(root, "--log") as (resource, said):
+        # The value of a run before: the resource.
+        data = pathlib.Path(home, ".local/share/Oltrava/KyVisaTester/data.adr")
+        data.parent.mkdir(parents=True)
+        data.write_text(f"000001{len(resource):06}{resource}{0:06}{0:06}")
+        with open_window(root, home) as (display, _, window):
+            def until(text, *words):
+                """Tries again until the instrument has seen it: a click or a key before the window is ready goes nowhere."""
+                end = time.monotonic() + PATIENCE
+                while text not in said.read_text():
+                    assert time.monotonic() < end, f"{text}: not in {said.read_text()}"
+                    run("xdotool", *words, DISPLAY=display.name)
+                    pause = time.monotonic() + 2
+                    while text not in said.read_text() and time.monotonic() < pause:
+                        time.sleep(0.05)
+
+            run("xdotool", "windowmove", window, 0, 0, "windowsize", window, 750, 480, "windowfocus", window, DISPLAY=display.name)
+            until(" -- connected", "mousemove", 364, 90, "click", 1)
+            run("xdotool", "mousemove", 490, 170, "click", 1, "key", "ctrl+a", "type", "*IDN?\\n", DISPLAY=display.name)
+            until("-> *IDN?", "mousemove", 591, 200, "click", 1)
+            wait_for("the answer", lambda: "<- Oltrava,KyVisaSimulator," in said.read_text())
+        print("".join(line for line in said.read_text().splitlines(True) if "IDN?" in line or "<- " in line), end="")
+
+
 def asks(root, program):
-    with simulator(root, "--profile", "multimeter") as resource:
+    with simulator(root, "--profile", "multimeter") as (resource, _):
         answer = run(program, resource, LD_LIBRARY_PATH=str(library_folder(root)))
         identification = pathlib.Path(root / "share/kyvisa/profiles/multimeter.json").read_text()
         model = re.search(r'"model"\s*:\s*"([^"]+)"', identification)[1]
@@ -131,4 +164,4 @@ if case == "install":
 else:
     stage, prefix, *rest = arguments
     place = pathlib.Path(stage).resolve() / prefix.lstrip("/")
-    {"files": files, "tester": tester, "pkg-config": with_pkg_config, "cmake": with_cmake}[case](place, *rest)
+    {"files": files, "tester": tester, "session": session, "pkg-config": with_pkg_config, "cmake": with_cmake}[case](place, *rest)

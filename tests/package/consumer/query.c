@@ -14,6 +14,8 @@ int main(int argc, char **argv)
     status = viOpen(manager, argv[1], VI_NULL, 20000, &instrument);
     if (status >= VI_SUCCESS)
         status = viSetAttribute(instrument, VI_ATTR_TMO_VALUE, 20000);
+    if (status >= VI_SUCCESS) /* a raw socket has no other end of an answer than its line feed */
+        status = viSetAttribute(instrument, VI_ATTR_TERMCHAR_EN, VI_TRUE);
     if (status >= VI_SUCCESS)
         status = viQueryf(instrument, "*IDN?\n", "%t", answer);
     printf("%s", answer);
