@@ -3,6 +3,7 @@
 #include "support/SocketOptions.h"
 #include "support/VisaSession.h"
 
+#include <chrono>
 #include <future>
 #include <gtest/gtest.h>
 
@@ -86,17 +87,17 @@ TEST(AttributeEffect, KeepAliveAndNoDelayReachTheConnectionsOfHislip)
 
 TEST(AttributeEffect, WriteBufferThatIsFlushedOnAccessSendsEachPrint)
 {
-    std::promise<void> bothHaveCome;
+    std::promise<void> hasCome;
     overSocket(
         [&](PeerConnection &client) {
             client.expect("no line end"); // with the line end of the next one it would come later
-            bothHaveCome.set_value();
+            hasCome.set_value();
             client.expect("kept and now a line\n");
         },
         [&](VisaSession &session, const std::vector<int> &) {
             EXPECT_EQ(session.set(VI_ATTR_WR_BUF_OPER_MODE, VI_FLUSH_ON_ACCESS), VI_SUCCESS);
             EXPECT_EQ(viPrintf(session.vi, "no line end"), VI_SUCCESS);
-            bothHaveCome.get_future().wait();
+            EXPECT_EQ(hasCome.get_future().wait_for(std::chrono::seconds(30)), std::future_status::ready);
             EXPECT_EQ(session.set(VI_ATTR_WR_BUF_OPER_MODE, VI_FLUSH_WHEN_FULL), VI_SUCCESS);
             EXPECT_EQ(viPrintf(session.vi, "kept"), VI_SUCCESS);
             EXPECT_EQ(viPrintf(session.vi, " and now a line\n"), VI_SUCCESS);

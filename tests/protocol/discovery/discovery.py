@@ -51,13 +51,13 @@ def datagrams_sent():
     return int(values[names.index("OutDatagrams")])
 
 
-def odd_host(switch, script):
-    """A host on which a few lines of Python answer at the portmapper's port."""
+def odd_host(switch, script, before=""):
+    """A host on which a few lines of Python answer at the portmapper's port. @param before what it does first"""
     host = Host(switch)
     host.start(sys.executable, "-c", "import socket, struct\n"
                "s = socket.socket(socket.AF_INET, socket.SOCK_DGRAM)\n"
                "s.setsockopt(socket.SOL_SOCKET, socket.SO_BROADCAST, 1)\n"
-               "s.bind(('', 111))\n"
+               "s.bind(('', 111))\n" + before +
                "print('ready', flush=True)\n"
                "while True:\n"
                "    call, peer = s.recvfrom(9000)\n"
@@ -135,6 +135,8 @@ expect("datagrams sent", datagrams_sent() - before, 0)
 print("odd hosts beside them")
 odd_host(first, "    s.sendto(reply + struct.pack('>I', 0), peer)\n")        # does not serve the program
 odd_host(first, "    s.sendto(reply + struct.pack('>I', 4321), peer)\n")     # serves it where nobody listens
+odd_host(first, "    s.sendto(reply + struct.pack('>I', 4321), peer)\n",    # takes the connection and never says a word
+         before="t = socket.create_server(('', 4321))\n")
 odd_host(first, "    s.sendto(reply + struct.pack('>I', 99999), peer)\n")    # no port
 odd_host(second, "    [s.sendto((reply + struct.pack('>I', 4321))[:n], peer) for n in range(28)]\n")  # every truncation
 odd_host(second, "    s.sendto(b'\\xff' * 4 + reply[4:] + struct.pack('>I', 4321), peer)\n")          # another's xid
