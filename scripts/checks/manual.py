@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
-"""Checks that docs/libkyvisa.md knows the environment variables and the configuration keys that the library reads, no others, and that its
-C examples compile.
+"""Checks that docs/libkyvisa.md and the manual pages know the environment variables and the configuration keys that the library reads, no
+others, and that the C examples of the former compile.
 
 Usage: manual.py [ROOT]. Status 1 and one line a finding.
 """
@@ -43,6 +43,15 @@ sections = set(re.findall(r'equalIgnoringCase\(section, "([\w-]+)"\)', reader)) 
 compare("section", sections, {row[0].strip("`") for row in rows})
 keys = set(re.findall(r'equalIgnoringCase\(key, "(\w+)"\)', reader)) | {f"{key}0" for key in re.findall(r'numberedKey\(key, "(\w+)"\)', reader)}
 compare("key", keys, {re.match(r"`(\w+)`", row[1])[1] for row in rows})
+
+# The manual pages tell the same.
+page = "\n".join((ROOT / "docs" / "man" / name).read_text(encoding="utf-8") for name in ("kyvisa.ini.5", "libkyvisa.3")).replace("\\-", "-")
+environment = " ".join(re.findall(r"^\.SH ENVIRONMENT\n(.*?)(?=^\.SH )", page, re.M | re.S))
+compare("manual pages: variable", variables,
+        set(re.findall(r"\b[A-Z][A-Z_]+[A-Z]\b", " ".join(re.findall(r"^\.BR? ([A-Z].*)$", environment.replace(".TP", ""), re.M)))))
+described = page.split(".SH SECTIONS")[1].split(".SH EXAMPLES")[0]
+compare("manual pages: section", sections, set(re.findall(r"\[([\w-]+)\]", " ".join(re.findall(r"^\.SS (.*)$", described, re.M)))))
+compare("manual pages: key", keys, set(re.findall(r"^\.TP\n\.BR? (\w+)", described, re.M)))
 
 # Each piece of C in a function of its own.
 pieces = re.findall(r"^```c\n(.*?)^```", manual, re.M | re.S)
