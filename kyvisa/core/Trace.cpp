@@ -71,6 +71,12 @@ void appendAddress(std::string &to, const void *address)
     to += text.data();
 }
 
+void tell(std::string line)
+{
+    line += '\n';
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
 void write(const char *operation, std::string_view arguments, ViStatus status, std::chrono::nanoseconds duration)
 {
     std::string line = std::string(operation) + "(" + std::string(arguments) + ") = ";

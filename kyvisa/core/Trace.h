@@ -13,6 +13,8 @@
  *
  *     viWrite(2, "*IDN?\n", 6, 6) = VI_SUCCESS, 0.041 ms
  *
+ * Beside them come lines about what a call did that its arguments do not show, such as where a search was made.
+ *
  * It is the only thing that the library ever prints. Each line is written in one piece.
  */
 namespace kyvisa::trace
@@ -31,6 +33,9 @@ void switchTo(bool on);
 void appendText(std::string &to, const char *text);
 void appendBytes(std::string &to, const void *data, std::size_t count);
 void appendAddress(std::string &to, const void *address);
+
+/// One line of its own about what a call is doing.
+void tell(std::string line);
 
 void write(const char *operation, std::string_view arguments, ViStatus status, std::chrono::nanoseconds duration);
 

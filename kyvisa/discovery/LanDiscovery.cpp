@@ -1,5 +1,6 @@
 #include "kyvisa/discovery/LanDiscovery.h"
 
+#include "kyvisa/core/Trace.h"
 #include "kyvisa/discovery/HostCollection.h"
 #include "kyvisa/discovery/HttpGet.h"
 #include "kyvisa/discovery/MdnsQuery.h"
@@ -8,6 +9,8 @@
 #include "kyvisa/discovery/Vxi11Query.h"
 #include "kyvisa/os/Poll.h"
 
+#include <arpa/inet.h>
+#include <array>
 #include <memory>
 #include <mutex>
 #include <utility>
@@ -28,25 +31,52 @@ constexpr std::uint16_t AskPortmapper = 0;
 class Search
 {
 public:
-    Search(const DiscoveryMethods &methods, const os::WaitLimit &limit) : m_limit(limit)
+    Search(const DiscoveryMethods &methods, const os::WaitLimit &limit)
+        : m_methods(methods), m_limit(limit), m_interfaces(os::networkInterfaces())
     {
-        const std::vector<os::NetworkInterface> interfaces = os::networkInterfaces();
         if (methods.vxi11)
             m_queries.push_back(std::make_unique<Vxi11Query>(
-                interfaces, [this](const std::string &host, std::uint16_t port) { foundVxi11(host, port); }));
+                m_interfaces, [this](const std::string &host, std::uint16_t port) { foundVxi11(host, port); }));
         if (methods.mdns)
             m_queries.push_back(std::make_unique<MdnsQuery>(
-                interfaces, [this](const Announcement &announcement) { announced(announcement); }));
+                m_interfaces, [this](const Announcement &announcement) { announced(announcement); }));
     }
 
     std::vector<FoundResource> run()
     {
         const bool heard = listen();
         m_tasks.finish();
-        return heard ? resourcesOf(m_hosts) : std::vector<FoundResource>();
+        auto found = heard ? resourcesOf(m_hosts) : std::vector<FoundResource>();
+        if (trace::isOn())
+            tell(found.size());
+        return found;
     }
 
 private:
+    /// Who finds nothing wants to know where it was looked for.
+    void tell(std::size_t resources) const
+    {
+        std::string line = "search by ";
+        line += m_methods.vxi11 ? "VXI-11" : "";
+        line += m_methods.vxi11 && m_methods.mdns ? " and " : "";
+        line += m_methods.mdns ? "mDNS" : "";
+        if (m_interfaces.empty()) {
+            trace::tell(line + ": no network interface is up");
+            return;
+        }
+        const char *between = " on ";
+        for (const os::NetworkInterface &interface : m_interfaces) {
+            std::array<char, INET_ADDRSTRLEN> address{};
+            ::inet_ntop(AF_INET, &interface.address, address.data(), address.size());
+            line += std::exchange(between, ", ");
+            line += address.data();
+        }
+        const auto counted = [](std::size_t number, const char *what) {
+            return std::to_string(number) + " " + what + (number == 1 ? "" : "s");
+        };
+        trace::tell(line + ": " + counted(m_hosts.size(), "host") + " answered, " + counted(resources, "resource"));
+    }
+
     /// @return false when another thread ended it.
     bool listen()
     {
@@ -168,7 +198,9 @@ private:
         return m_hosts.size() < MostHosts ? &m_hosts[address] : nullptr;
     }
 
+    const DiscoveryMethods m_methods;
     const os::WaitLimit m_limit;
+    const std::vector<os::NetworkInterface> m_interfaces;
     std::mutex m_mutex;
     FoundHosts m_hosts;
     std::vector<std::unique_ptr<LanQuery>> m_queries;
