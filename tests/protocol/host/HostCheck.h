@@ -45,6 +45,12 @@ struct Possessions {
     bool operator==(const Possessions &) const = default;
 };
 
+/// To be called before what one has is counted: the sanitizers start a thread of their own beside the first other one.
+inline void beginToHaveThreads()
+{
+    std::thread([] {}).join();
+}
+
 /// A thread that was joined is still listed for a moment.
 inline void checkBackTo(const Possessions &before)
 {

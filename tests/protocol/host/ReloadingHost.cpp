@@ -101,6 +101,7 @@ int main(int argc, char **argv)
     CHECK(argc > 2);
     ::alarm(300); // whatever hangs ends by a signal
     const std::vector<std::string> names(argv + 2, argv + argc);
+    host::beginToHaveThreads();
     const Possessions before;
     for (int round = 0; round < 5; ++round)
         loadUseCloseUnload(argv[1], names, before);

@@ -48,6 +48,7 @@ int main(int argc, char **argv)
 {
     CHECK(argc > 4);
     ::alarm(300);
+    host::beginToHaveThreads();
     const Possessions before;
     const std::array copies = {LoadedLibrary(argv[1]), LoadedLibrary(argv[2])};
     CHECK(copies[0].open != copies[1].open);
