@@ -82,11 +82,8 @@ bool decode(xdr::Reader &reader, CreateLinkResult &value)
 
 void encodeHead(xdr::Writer &writer, const WriteCall &value)
 {
-    writer.i32(value.link);
-    writer.u32(value.ioTimeout);
-    writer.u32(value.lockTimeout);
-    writer.u32(value.flags);
-    writer.opaqueHead(value.data.size());
+    writer.u32s({static_cast<std::uint32_t>(value.link), value.ioTimeout, value.lockTimeout, value.flags,
+                 static_cast<std::uint32_t>(value.data.size())});
 }
 
 void encode(xdr::Writer &writer, const WriteCall &value)
@@ -123,12 +120,8 @@ bool decode(xdr::Reader &reader, WriteResult &value)
 
 void encode(xdr::Writer &writer, const ReadCall &value)
 {
-    writer.i32(value.link);
-    writer.u32(value.requestSize);
-    writer.u32(value.ioTimeout);
-    writer.u32(value.lockTimeout);
-    writer.u32(value.flags);
-    writer.u32(value.termChar);
+    writer.u32s({static_cast<std::uint32_t>(value.link), value.requestSize, value.ioTimeout, value.lockTimeout,
+                 value.flags, value.termChar});
 }
 
 bool decode(xdr::Reader &reader, ReadCall &value)

@@ -22,6 +22,16 @@ void Writer::u32(std::uint32_t value)
     m_buffer.insert(m_buffer.end(), bytes, bytes + 4);
 }
 
+void Writer::u32s(std::initializer_list<std::uint32_t> values)
+{
+    std::size_t position = m_buffer.size();
+    m_buffer.resize(position + 4 * values.size());
+    for (const std::uint32_t value : values) {
+        store(&m_buffer[position], value);
+        position += 4;
+    }
+}
+
 void Writer::opaque(Bytes data)
 {
     opaqueHead(data.size());

@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <initializer_list>
 #include <span>
 #include <string_view>
 #include <vector>
@@ -32,6 +33,8 @@ public:
     explicit Writer(std::vector<std::byte> &buffer) : m_buffer(buffer) {}
 
     void u32(std::uint32_t value);
+    /// The same as u32() for each, in one go.
+    void u32s(std::initializer_list<std::uint32_t> values);
     void i32(std::int32_t value) { u32(static_cast<std::uint32_t>(value)); }
     void boolean(bool value) { u32(value ? 1 : 0); }
     void opaque(Bytes data);

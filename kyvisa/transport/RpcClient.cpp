@@ -142,6 +142,11 @@ os::Transfer RpcClient::takeSome(std::span<std::byte> to, const os::WaitLimit &l
 
 os::Transfer RpcClient::take(std::span<std::byte> to, const os::WaitLimit &limit)
 {
+    // Nearly always the whole reply is here already.
+    if (to.size() <= m_fragmentLeft && to.size() <= m_input.data().size()) {
+        m_fragmentLeft -= to.size();
+        return {IoResult::Done, m_input.take(to)};
+    }
     os::Transfer done;
     while (done.count < to.size()) {
         if (done.count > 0 && limit.deadline.expired())

@@ -31,6 +31,17 @@ TEST(Xdr, WritesNumbersBigEndianInFourBytes)
     EXPECT_EQ(written([](Writer &w) { w.boolean(false); }), hex("00 00 00 00"));
 }
 
+TEST(Xdr, WritesSeveralNumbersAsOneAfterTheOther)
+{
+    EXPECT_EQ(written([](Writer &w) {
+                  w.u32(1);
+                  w.u32s({0x01020304, 0xFFFFFFFF, 0});
+                  w.u32s({});
+                  w.u32(2);
+              }),
+              hex("00 00 00 01  01 02 03 04  FF FF FF FF  00 00 00 00  00 00 00 02"));
+}
+
 TEST(Xdr, PadsDataWithZeroesToFourBytes)
 {
     EXPECT_EQ(written([](Writer &w) { w.string(""); }), hex("00 00 00 00"));
