@@ -311,12 +311,16 @@ Scanner::Step Scanner::scanText(const Directive &directive)
     auto *const to = directive.discard ? nullptr : m_arguments.next<char *>();
     if (!to && !directive.discard)
         return Step::Wrong;
-    const std::size_t room = !width.given ? NoLimit : width.value > 0 ? width.value - 1 : 0;
+    // The width of %s, %t and %T is the buffer's size and includes the NUL. That of %[ is C's: the most characters to take.
+    // A size that comes from a variable is a buffer's in either case.
+    const bool asInC = directive.code == '[' && directive.width.from == Amount::From::Format;
+    const std::size_t most = asInC ? width.value : NoLimit;
+    const std::size_t room = !width.given || asInC ? NoLimit : width.value > 0 ? width.value - 1 : 0;
     if (directive.code == 's')
         skipBlanks();
     std::size_t stored = 0;
     std::size_t taken = 0;
-    for (;; ++taken) {
+    for (; taken < most; ++taken) {
         const int c = m_source.peek();
         if (c == InputSource::Nothing || (directive.code == 's' && isBlank(c)) ||
             (directive.code == '[' && !directive.set.test(static_cast<unsigned char>(c))))

@@ -187,6 +187,21 @@ TEST(FormatScan, ReadsSetsOfCharacters)
     EXPECT_STREQ(rest, "kept");
 }
 
+// Unlike that of %s, which is the size of the buffer.
+TEST(FormatScan, TakesAWidthOfASetAsCDoes)
+{
+    char first[8] = "";
+    char rest[8] = "";
+    EXPECT_EQ(scan("123456", "%4[0-9]%s", first, rest), VI_SUCCESS);
+    EXPECT_STREQ(first, "1234");
+    EXPECT_STREQ(rest, "56");
+    int size = 4;
+    EXPECT_EQ(scan("123456,9", "%#[0-9],%s", &size, first, rest), VI_SUCCESS);
+    EXPECT_STREQ(first, "123");
+    EXPECT_STREQ(rest, "9");
+    EXPECT_EQ(size, 3);
+}
+
 TEST(FormatScan, ReadsToTheEndOrToTheLineFeed)
 {
     char text[32];
