@@ -295,13 +295,13 @@ TEST_F(Events, AHandlerMayTakeItselfOut)
 TEST_F(Events, TakingAHandlerOutWaitsForTheCallThatIsGoingOn)
 {
     std::promise<void> entered;
-    std::promise<void> mayReturn;
     std::atomic<bool> returned{false};
     Actor slow;
     slow.act = [&](ViEvent) {
         entered.set_value();
-        mayReturn.get_future().wait();
-        for (int i = 0; i < 1000; ++i)
+        while (m_hub->enable(Srq, VI_HNDLR, 0) != VI_ERROR_HNDLR_NINSTALLED) // until it has been taken out
+            std::this_thread::yield();
+        for (int i = 0; i < 20'000; ++i)
             std::this_thread::yield();
         returned = true;
     };
@@ -309,9 +309,9 @@ TEST_F(Events, TakingAHandlerOutWaitsForTheCallThatIsGoingOn)
     ASSERT_EQ(m_hub->enable(Srq, VI_HNDLR, 0), VI_SUCCESS);
     post(Srq);
     entered.get_future().wait();
-    mayReturn.set_value();
     EXPECT_EQ(m_hub->uninstall(Srq, Actor::call, &slow), VI_SUCCESS);
     EXPECT_TRUE(returned);
+    ASSERT_TRUE(slow.awaitCalls(1));
 }
 
 TEST_F(Events, NoOtherHandlerIsCalledOnceOneHasClosedTheSession)
