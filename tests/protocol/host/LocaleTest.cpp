@@ -57,7 +57,7 @@ TEST_F(GermanHost, PrintsAndScansNumbersAsInstrumentsDo)
         EXPECT_EQ(viQueryf(session.vi, "SOUR:VOLT?;:SYST:ERR?\n", "%t", text.data()), VI_SUCCESS);
         EXPECT_EQ(std::strtod(text.data(), nullptr), 4.0) << "strtod speaks German here, so it stops at the point";
         EXPECT_NE(std::string(text.data()).find(";0,\"No error\""), std::string::npos) << text.data();
-        std::array<ViByte, 64> buffer{};
+        std::array<ViByte, 256> buffer{};
         const std::array<double, 3> values = {1234567.5, -0.25, 1e-7};
         EXPECT_EQ(viSPrintf(session.vi, buffer.data(), "%,3lg|%,3lf|%d", values.data(), values.data(), 1234567),
                   VI_SUCCESS);
@@ -89,7 +89,7 @@ TEST_F(GermanHost, ReadsNamesAndFilesAsEverybodyElse)
     EXPECT_EQ(viFindRsrc(session.rm, expression.c_str(), nullptr, &count, found.data()), VI_SUCCESS) << expression;
     EXPECT_EQ(count, 1u);
     EXPECT_EQ(session.getText(VI_ATTR_RSRC_NAME), found.data());
-    std::array<ViByte, 64> buffer{};
+    std::array<ViByte, 256> buffer{};
     EXPECT_EQ(viSPrintf(session.vi, buffer.data(), "%s", "\xC3\xA4"), VI_SUCCESS);
     EXPECT_STREQ(reinterpret_cast<const char *>(buffer.data()), "\xC3\xA4");
 }
