@@ -4,7 +4,6 @@
 #include <QCoreApplication>
 #include <QEvent>
 #include <QGenericPlugin>
-#include <QTimer>
 
 #include <unistd.h>
 
@@ -23,10 +22,17 @@ public:
     {
         if (event->type() == QEvent::Paint && watched->isWidgetType()) {
             QCoreApplication::instance()->removeEventFilter(this);
-            // All widgets of a window are painted before the event loop goes on.
-            QTimer::singleShot(0, this, &FirstPaint::painted);
+            // All widgets of a window are painted in one go; this is the first thing that happens then.
+            QCoreApplication::postEvent(this, new QEvent(QEvent::User), Qt::HighEventPriority);
         }
         return false;
+    }
+
+    bool event(QEvent *event) override
+    {
+        if (event->type() == QEvent::User)
+            painted();
+        return QObject::event(event);
     }
 
 private:
