@@ -22,7 +22,7 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
 from virtual_display import VirtualDisplay  # noqa: E402
 
-PATIENCE = 60  # seconds
+PATIENCE = 120  # seconds, for a machine with other work
 WARNINGS = ["-std=c99", "-Wall", "-Wextra", "-Werror"]
 case, *arguments = sys.argv[1:]
 # Nothing of the build folder, and nothing of the user.
