@@ -37,7 +37,9 @@ if [ "${1:-}" != prepared ]; then
   exec unshare --net "$0" prepared
 fi
 ip link set lo up
+# What the system keeps of all packages, it keeps from the beginning.
 ldconfig
+mandb --quiet
 files >/tmp/before
 
 say "installing $(echo $names)"
