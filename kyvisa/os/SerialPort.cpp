@@ -7,6 +7,7 @@
 #include <asm/termios.h> // termios2, any baud rate: the C library's header has neither and does not go with this one
 #include <cerrno>
 #include <chrono>
+#include <climits>
 #include <linux/serial.h>
 #include <sys/file.h>
 #include <utility>
@@ -18,6 +19,9 @@ namespace
 
 constexpr std::chrono::milliseconds BreakLength{250};
 constexpr std::chrono::milliseconds BetweenLooks{2};
+/// At the end: for what is on its way, and between two looks whether it moves at all.
+constexpr std::chrono::seconds PatienceAtClose{10};
+constexpr std::chrono::milliseconds StandstillAtClose{500};
 
 unsigned sizeFlag(std::uint8_t bits)
 {
@@ -58,7 +62,8 @@ bool stopBitsPossible(const SerialSettings &settings)
 
 void fill(termios2 &line, const SerialSettings &settings)
 {
-    line.c_iflag = PARMRK | (settings.parity != SerialParity::None ? INPCK : 0) | (settings.xonXoff ? IXON | IXOFF : 0);
+    // Without INPCK the system marks no framing errors either.
+    line.c_iflag = PARMRK | INPCK | (settings.xonXoff ? IXON | IXOFF : 0);
     line.c_oflag = 0;
     line.c_lflag = 0;
     line.c_cflag = CREAD | CLOCAL | HUPCL | BOTHER | (BOTHER << IBSHIFT) | sizeFlag(settings.dataBits) |
@@ -100,6 +105,12 @@ int bitOf(SerialLine line)
 IoResult failure(int error)
 {
     return error == ENOMEM ? IoResult::NoMemory : IoResult::Closed;
+}
+
+/// The adapter was pulled out, or the other end of a pseudo terminal has gone.
+bool hasGone(int error)
+{
+    return error == EIO || error == ENXIO || error == ENODEV || error == EBADF;
 }
 
 } // namespace
@@ -148,12 +159,30 @@ SerialPort::Opened SerialPort::open(const std::string &path)
     return Opened::Done;
 }
 
-void SerialPort::close()
+/// True when everything has left. A stopped line is given up soon.
+bool SerialPort::letLeave()
+{
+    const Wakeup nobody;
+    const Deadline atLast = Deadline::after(PatienceAtClose);
+    for (int before = INT_MAX;;) {
+        const IoResult result = drain({atLast.orEarlier(Deadline::after(StandstillAtClose)), nobody});
+        if (result != IoResult::TimedOut)
+            return result == IoResult::Done;
+        const int now = unsent();
+        if (now >= before || atLast.expired())
+            return false;
+        before = now;
+    }
+}
+
+void SerialPort::close(Unsent unsent)
 {
     if (!isOpen())
         return;
     if (m_found) {
-        control(TCFLSH, reinterpret_cast<void *>(TCOFLUSH)); // or a stopped line would hold the close
+        const bool allLeft = unsent == Unsent::Leaves && letLeave();
+        if (!allLeft)
+            control(TCFLSH, reinterpret_cast<void *>(TCOFLUSH)); // or a stopped line would hold the close
         control(TCSETS2, &m_found->settings);
         control(TIOCNXCL, nullptr);
     }
@@ -232,6 +261,7 @@ Transfer SerialPort::send(std::span<const std::byte> data, const WaitLimit &limi
     Transfer done;
     if (!isOpen())
         return {IoResult::Closed, 0};
+    bool waited = false;
     while (done.count < data.size()) {
         if (limit.wakeup.raised())
             return {IoResult::Woken, done.count};
@@ -247,6 +277,9 @@ Transfer SerialPort::send(std::span<const std::byte> data, const WaitLimit &limi
             continue;
         if (sent < 0 && errno != EAGAIN)
             return {failure(errno), done.count};
+        // A driver may call itself writable and then take nothing.
+        if (std::exchange(waited, true) && limit.deadline.expired())
+            return {IoResult::TimedOut, done.count};
         done.result = waitFor(POLLOUT, limit);
         if (done.result != IoResult::Done)
             return done;
@@ -254,14 +287,26 @@ Transfer SerialPort::send(std::span<const std::byte> data, const WaitLimit &limi
     return done;
 }
 
+/// Bytes that wait for the line; -1 when the port does not say.
+int SerialPort::unsent() const
+{
+    int count = 0;
+    if (!control(TIOCOUTQ, &count))
+        return -1;
+    // The chip has a store of its own, and most drivers tell when that is empty too.
+    int transmitter = TIOCSER_TEMT;
+    control(TIOCSERGETLSR, &transmitter);
+    return count == 0 && (transmitter & TIOCSER_TEMT) == 0 ? 1 : count;
+}
+
 IoResult SerialPort::drain(const WaitLimit &limit)
 {
     // Not tcdrain(): that could not be given a time-out, nor be ended by another thread.
     for (;;) {
-        int unsent = 0;
-        if (!control(TIOCOUTQ, &unsent))
+        const int left = unsent();
+        if (left < 0)
             return failure(errno);
-        if (unsent == 0)
+        if (left == 0)
             return IoResult::Done;
         std::array<pollfd, 1> nothing{};
         const IoResult waited = pollWithin(nothing, limit, Deadline::after(BetweenLooks));
@@ -270,10 +315,12 @@ IoResult SerialPort::drain(const WaitLimit &limit)
     }
 }
 
-IoResult SerialPort::sendBreak(const WaitLimit &limit)
+std::optional<IoResult> SerialPort::sendBreak(const WaitLimit &limit)
 {
-    if (!isOpen() || !control(TIOCSBRK, nullptr))
+    if (!isOpen())
         return IoResult::Closed;
+    if (!control(TIOCSBRK, nullptr))
+        return hasGone(errno) ? std::optional(IoResult::Closed) : std::nullopt;
     std::array<pollfd, 1> nothing{};
     const IoResult waited = pollWithin(nothing, limit, Deadline::after(BreakLength));
     control(TIOCCBRK, nullptr);

@@ -47,6 +47,8 @@ class SerialPort
 {
 public:
     enum class Opened { Done, Absent, Busy, Denied };
+    /// What becomes of bytes that were sent and still wait for the line when the port is closed.
+    enum class Unsent { Leaves, Discarded };
 
     SerialPort();
     ~SerialPort();
@@ -55,7 +57,8 @@ public:
 
     Opened open(const std::string &path);
     bool isOpen() const { return m_descriptor >= 0; }
-    void close();
+    /// What leaves may take ten seconds; a line that stands still is given up after one.
+    void close(Unsent unsent = Unsent::Discarded);
     /// In a forked child: frees the descriptor, changes nothing.
     void abandon();
 
@@ -68,8 +71,8 @@ public:
     Transfer send(std::span<const std::byte> data, const WaitLimit &limit);
     /// Waits until the last bit has left.
     IoResult drain(const WaitLimit &limit);
-    /// Holds the line in the break state for a quarter of a second.
-    IoResult sendBreak(const WaitLimit &limit);
+    /// Holds the line in the break state for a quarter of a second. Nothing when the port cannot do that.
+    std::optional<IoResult> sendBreak(const WaitLimit &limit);
     void discardInput();
     void discardOutput();
 
@@ -85,6 +88,8 @@ private:
 
     IoResult waitFor(short events, const WaitLimit &limit) const;
     bool control(unsigned long request, void *argument) const;
+    int unsent() const;
+    bool letLeave();
 
     int m_descriptor = -1;
     std::unique_ptr<Found> m_found; ///< the settings before ours

@@ -83,6 +83,7 @@ Transfer StreamSocket::send(std::span<iovec> pieces, const WaitLimit &limit)
     Transfer done;
     if (!isOpen())
         return {IoResult::Closed, 0};
+    bool waited = false;
     while (!pieces.empty()) {
         if (limit.wakeup.raised())
             return {IoResult::Woken, done.count};
@@ -101,6 +102,8 @@ Transfer StreamSocket::send(std::span<iovec> pieces, const WaitLimit &limit)
             continue;
         if (!wouldBlock(errno))
             return {errno == ENOMEM || errno == ENOBUFS ? IoResult::NoMemory : IoResult::Closed, done.count};
+        if (std::exchange(waited, true) && limit.deadline.expired()) // ready, and yet it took nothing
+            return {IoResult::TimedOut, done.count};
         done.result = waitFor(POLLOUT, limit);
         if (done.result != IoResult::Done)
             return done;
@@ -146,6 +149,8 @@ Transfer StreamSocket::receive(std::span<std::byte> buffer, const WaitLimit &lim
         const Transfer got = receiveOnce(buffer, first && mayWaitBriefly(limit) ? 0 : MSG_DONTWAIT);
         if (got.result != IoResult::Done || got.count > 0)
             return got;
+        if (!first && limit.deadline.expired()) // ready, and yet there was nothing
+            return {IoResult::TimedOut, 0};
         const IoResult waited = waitFor(POLLIN, limit);
         if (waited != IoResult::Done)
             return {waited, 0};

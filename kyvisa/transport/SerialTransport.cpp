@@ -113,21 +113,19 @@ ViStatus SerialTransport::fill(const os::WaitLimit &limit)
     return VI_SUCCESS;
 }
 
-/// The error of the byte that was read last, from what the driver has counted since.
+/// The error of the byte that was read last, from what the driver has counted since. Where it has counted both kinds, the other
+/// one is that of a byte which is still to come.
 ViStatus SerialTransport::takeError()
 {
     m_input.errorTold();
-    const auto now = m_port.errors();
-    const os::SerialErrors before = m_errors;
-    if (now) {
-        m_errors.parity = now->parity;
-        m_errors.framing = now->framing;
-    }
-    const bool parity = now && now->parity != before.parity;
-    const bool framing = now && now->framing != before.framing;
-    if (parity || (!framing && m_settings.parity != os::SerialParity::None))
+    const os::SerialErrors now = m_port.errors().value_or(m_errors);
+    if (now.parity != m_errors.parity) {
+        m_errors.parity = now.parity;
         return VI_ERROR_ASRL_PARITY;
-    return VI_ERROR_ASRL_FRAMING;
+    }
+    const bool framing = now.framing != m_errors.framing;
+    m_errors.framing = now.framing;
+    return framing || m_settings.parity == os::SerialParity::None ? VI_ERROR_ASRL_FRAMING : VI_ERROR_ASRL_PARITY;
 }
 
 ViStatus SerialTransport::read(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
@@ -199,6 +197,14 @@ ViStatus SerialTransport::write(std::span<const std::byte> data, const TransferM
         return VI_ERROR_CONN_LOST;
     if (m_answerMayBeLate)
         dropInput();
+    const ViStatus status = send(data, mode, limit, count);
+    m_messageStopped = status < VI_SUCCESS;
+    return status;
+}
+
+ViStatus SerialTransport::send(std::span<const std::byte> data, const TransferMode &mode, const os::WaitLimit &limit,
+                               std::size_t &count)
+{
     if (m_endOut == VI_ASRL_END_LAST_BIT)
         return sendMarked(data, mode.sendEnd, limit, count);
     const os::Transfer sent = m_port.send(data, limit);
@@ -212,7 +218,10 @@ ViStatus SerialTransport::write(std::span<const std::byte> data, const TransferM
     if (m_endOut != VI_ASRL_END_BREAK)
         return VI_SUCCESS;
     const os::IoResult drained = m_port.drain(limit);
-    return ended(drained == os::IoResult::Done ? m_port.sendBreak(limit) : drained, limit);
+    if (drained != os::IoResult::Done)
+        return ended(drained, limit);
+    const std::optional<os::IoResult> broken = m_port.sendBreak(limit);
+    return broken ? ended(*broken, limit) : VI_ERROR_INV_SETUP;
 }
 
 ViStatus SerialTransport::readStatusByte(const TransferMode &mode, const os::WaitLimit &limit, ViUInt16 &status)
@@ -234,9 +243,9 @@ ViStatus SerialTransport::clear(const os::WaitLimit &limit)
     if (!m_port.isOpen())
         return VI_ERROR_CONN_LOST;
     m_port.discardOutput();
-    const os::IoResult result = m_port.sendBreak(limit);
+    const std::optional<os::IoResult> broken = m_port.sendBreak(limit);
     dropInput();
-    return ended(result, limit);
+    return broken ? ended(*broken, limit) : VI_SUCCESS; // a port without a break has been cleared on this side
 }
 
 ViStatus SerialTransport::applyAttribute(ViAttr attribute, ViUInt64 value, const os::WaitLimit &)
@@ -348,7 +357,7 @@ ViStatus SerialTransport::flushLine(ViUInt16 mask, const os::WaitLimit &limit)
 
 void SerialTransport::close()
 {
-    m_port.close();
+    m_port.close(m_messageStopped ? os::SerialPort::Unsent::Discarded : os::SerialPort::Unsent::Leaves);
 }
 
 void SerialTransport::abandon()

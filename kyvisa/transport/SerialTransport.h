@@ -46,6 +46,8 @@ private:
     ViStatus fill(const os::WaitLimit &limit);
     ViStatus takeError();
     bool endsAt(std::byte byte, const TransferMode &mode) const;
+    ViStatus send(std::span<const std::byte> data, const TransferMode &mode, const os::WaitLimit &limit,
+                  std::size_t &count);
     ViStatus sendMarked(std::span<const std::byte> data, bool markLast, const os::WaitLimit &limit, std::size_t &count);
     void dropInput();
     std::byte topBit() const;
@@ -58,6 +60,7 @@ private:
     ViUInt16 m_endOut;
     bool m_overrun = false;
     bool m_answerMayBeLate = false;
+    bool m_messageStopped = false; ///< the last write ended early: nobody misses what of it is still to leave
 };
 
 } // namespace kyvisa

@@ -36,6 +36,10 @@ struct Driver {
     bool countsErrors = true;
     serial_icounter_struct counters{};
     int unsent = 0;
+    bool moves = true; ///< what is unsent gets less
+    int inTheChip = 0; ///< looks at the transmitter until that is empty too
+    int breakError = 0;
+    bool takesOutput = true;
     std::vector<std::string> log;
     std::string input;
     std::string output;
@@ -106,7 +110,12 @@ int controlPort(int, unsigned long request, void *argument)
     case TIOCOUTQ:
         *static_cast<int *>(argument) = driver.unsent;
         driver.log.push_back("outq " + std::to_string(driver.unsent));
-        driver.unsent = std::max(0, driver.unsent - 1);
+        if (driver.moves)
+            driver.unsent = std::max(0, driver.unsent - 1);
+        return 0;
+    case TIOCSERGETLSR:
+        *static_cast<int *>(argument) = driver.inTheChip > 0 ? 0 : TIOCSER_TEMT;
+        driver.inTheChip = std::max(0, driver.inTheChip - 1);
         return 0;
     case TIOCINQ:
         *static_cast<int *>(argument) = static_cast<int>(driver.input.size());
@@ -117,6 +126,8 @@ int controlPort(int, unsigned long request, void *argument)
             driver.input.clear();
         return 0;
     case TIOCSBRK:
+        if (driver.breakError != 0)
+            return fail(driver.breakError);
         driver.log.push_back("break on");
         return 0;
     case TIOCCBRK:
@@ -134,6 +145,11 @@ ssize_t readPort(int, void *buffer, size_t size)
 {
     if (g_driver->input.empty())
         return fail(EAGAIN);
+    // termios(3): PARMRK is meaningful only when INPCK is set
+    const std::string mark("\xFF\0", 2);
+    for (std::size_t at = 0;
+         (g_driver->line.c_iflag & INPCK) == 0 && (at = g_driver->input.find(mark, at)) != std::string::npos;)
+        g_driver->input.erase(at, mark.size());
     const std::size_t count = std::min(size, g_driver->input.size());
     std::memcpy(buffer, g_driver->input.data(), count);
     g_driver->input.erase(0, count);
@@ -142,6 +158,8 @@ ssize_t readPort(int, void *buffer, size_t size)
 
 ssize_t writePort(int, const void *data, size_t size)
 {
+    if (!g_driver->takesOutput)
+        return fail(EAGAIN);
     g_driver->output.append(static_cast<const char *>(data), size);
     g_driver->log.push_back("write");
     return static_cast<ssize_t>(size);
@@ -196,10 +214,10 @@ protected:
         m_text.resize(count);
         return status;
     }
-    ViStatus write(std::string_view text)
+    ViStatus write(std::string_view text, int milliseconds = 5000)
     {
         std::size_t count = 0;
-        return m_transport->write(std::as_bytes(std::span(text)), m_mode, within(5000), count);
+        return m_transport->write(std::as_bytes(std::span(text)), m_mode, within(milliseconds), count);
     }
 
     Driver m_driver;
@@ -220,7 +238,7 @@ TEST_F(Serial, OpensRawWithTheStandardsDefaultsAndForItselfAlone)
     EXPECT_EQ(m_driver.log.at(1), "exclusive");
     EXPECT_EQ(m_driver.line.c_lflag, 0u);
     EXPECT_EQ(m_driver.line.c_oflag, 0u);
-    EXPECT_EQ(m_driver.line.c_iflag, static_cast<tcflag_t>(PARMRK));
+    EXPECT_EQ(m_driver.line.c_iflag, static_cast<tcflag_t>(PARMRK | INPCK));
     EXPECT_EQ(m_driver.line.c_cflag & CBAUD, static_cast<tcflag_t>(BOTHER));
     EXPECT_EQ(m_driver.line.c_ospeed, 9600u);
     EXPECT_EQ(m_driver.line.c_ispeed, 9600u);
@@ -238,6 +256,37 @@ TEST_F(Serial, ClosingPutsBackTheSettingsThatWereFound)
     EXPECT_EQ(m_driver.line.c_cflag, static_cast<tcflag_t>(CLOCAL | CREAD | CS7 | PARENB));
     EXPECT_EQ(read(), VI_ERROR_CONN_LOST);
     EXPECT_EQ(write("x"), VI_ERROR_CONN_LOST);
+}
+
+TEST_F(Serial, ClosingLetsOutWhatWasWritten)
+{
+    ASSERT_EQ(connect(), VI_SUCCESS);
+    EXPECT_EQ(write("OUTP OFF\n"), VI_SUCCESS);
+    m_driver.unsent = 2;
+    m_driver.log.clear();
+    m_transport->close();
+    EXPECT_EQ(m_driver.log, (std::vector<std::string>{"outq 2", "outq 1", "outq 0"}));
+}
+
+TEST_F(Serial, ClosingIsNotHeldByALineThatStandsStill)
+{
+    ASSERT_EQ(connect(), VI_SUCCESS);
+    EXPECT_EQ(write("OUTP OFF\n"), VI_SUCCESS);
+    m_driver.unsent = 9;
+    m_driver.moves = false;
+    m_transport->close();
+    EXPECT_EQ(m_driver.log.back(), "drop output");
+}
+
+TEST_F(Serial, ClosingDropsTheRestOfAMessageThatWasStopped)
+{
+    ASSERT_EQ(connect(), VI_SUCCESS);
+    m_driver.takesOutput = false;
+    EXPECT_EQ(write("OUTP OFF\n", 30), VI_ERROR_TMO);
+    m_driver.unsent = 2;
+    m_driver.log.clear();
+    m_transport->close();
+    EXPECT_EQ(m_driver.log, (std::vector<std::string>{"drop output"}));
 }
 
 TEST_F(Serial, SaysWhyAPortDoesNotOpen)
@@ -512,6 +561,31 @@ TEST_F(Serial, BreakComesBehindTheLastBit)
     EXPECT_EQ(m_driver.log, (std::vector<std::string>{"write", "outq 2", "outq 1", "outq 0", "break on", "break off"}));
 }
 
+TEST_F(Serial, BreakComesBehindWhatTheChipStillHolds)
+{
+    ASSERT_EQ(connect(), VI_SUCCESS);
+    ASSERT_EQ(set(VI_ATTR_ASRL_END_OUT, VI_ASRL_END_BREAK), VI_SUCCESS);
+    m_driver.inTheChip = 2;
+    m_driver.log.clear();
+    EXPECT_EQ(write("ab"), VI_SUCCESS);
+    EXPECT_EQ(m_driver.log, (std::vector<std::string>{"write", "outq 0", "outq 0", "outq 0", "break on", "break off"}));
+}
+
+TEST_F(Serial, PortThatCannotBreakIsNotLost)
+{
+    ASSERT_EQ(connect(), VI_SUCCESS);
+    m_driver.breakError = EOPNOTSUPP;
+    m_driver.input = "old\n";
+    EXPECT_EQ(m_transport->clear(within(5000)), VI_SUCCESS);
+    EXPECT_EQ(read(), VI_ERROR_TMO);
+    EXPECT_EQ(write("x"), VI_SUCCESS);
+    ASSERT_EQ(set(VI_ATTR_ASRL_END_OUT, VI_ASRL_END_BREAK), VI_SUCCESS);
+    EXPECT_EQ(write("x"), VI_ERROR_INV_SETUP);
+    m_driver.breakError = EIO;
+    EXPECT_EQ(m_transport->clear(within(5000)), VI_ERROR_CONN_LOST);
+    EXPECT_EQ(write("x"), VI_ERROR_CONN_LOST);
+}
+
 TEST_F(Serial, ClearDropsOutputBreaksAndDropsInput)
 {
     ASSERT_EQ(connect(), VI_SUCCESS);
@@ -596,6 +670,17 @@ TEST_F(Serial, FramingErrorsAreToldFromParityErrorsByTheDriversCounters)
     EXPECT_EQ(read(), VI_ERROR_ASRL_PARITY) << "without counters, what was asked to be checked";
     ASSERT_EQ(set(VI_ATTR_ASRL_PARITY, VI_ASRL_PAR_NONE), VI_SUCCESS);
     m_driver.input = std::string("\xFF\0x", 3);
+    EXPECT_EQ(read(), VI_ERROR_ASRL_FRAMING);
+}
+
+TEST_F(Serial, ErrorsOfBothKindsAreToldOneByOne)
+{
+    ASSERT_EQ(connect(), VI_SUCCESS);
+    ASSERT_EQ(set(VI_ATTR_ASRL_PARITY, VI_ASRL_PAR_EVEN), VI_SUCCESS);
+    m_driver.input = std::string("\xFF\0x\xFF\0y", 6);
+    m_driver.counters.parity = 1;
+    m_driver.counters.frame = 1;
+    EXPECT_EQ(read(), VI_ERROR_ASRL_PARITY);
     EXPECT_EQ(read(), VI_ERROR_ASRL_FRAMING);
 }
 

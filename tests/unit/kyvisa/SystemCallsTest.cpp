@@ -532,6 +532,32 @@ TEST(StreamSocket, AWriteNeverWaitsInTheSystem)
     EXPECT_NE(flagsOfTheWrite & MSG_DONTWAIT, 0);
 }
 
+TEST(StreamSocket, ReadinessThatComesToNothingDoesNotOutlastTheDeadline)
+{
+    SystemCalls seam = realSystemCalls();
+    seam.sendmsg = [](int, const msghdr *, int) -> ssize_t {
+        failWith(EAGAIN);
+        return -1;
+    };
+    seam.recv = [](int, void *, size_t, int) -> ssize_t {
+        failWith(EAGAIN);
+        return -1;
+    };
+    seam.poll = [](pollfd *watched, nfds_t, const timespec *) {
+        watched[0].revents = watched[0].events;
+        return 1;
+    };
+    ScriptedPeer peer([](ScriptedPeer &self) { self.accept().expectClosed(); });
+    const Wakeup nobody;
+    const ReplacedSystemCalls replaced(seam);
+    StreamSocket socket;
+    ASSERT_EQ(connectStream("127.0.0.1", peer.port(), within(20000, nobody), socket), IoResult::Done);
+    std::array letters = {std::byte{'x'}};
+    std::array pieces = {iovec{letters.data(), letters.size()}};
+    EXPECT_EQ(socket.send(pieces, within(20, nobody)).result, IoResult::TimedOut);
+    EXPECT_EQ(socket.receive(letters, within(20, nobody)).result, IoResult::TimedOut);
+}
+
 TEST(StreamSocket, ResetIsAClosedConnection)
 {
     std::atomic<bool> connected{false};
