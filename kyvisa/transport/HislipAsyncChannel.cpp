@@ -135,17 +135,24 @@ ViStatus HislipAsyncChannel::lockCall(const Header &header, std::span<const std:
                                       std::uint8_t &control, const os::WaitLimit &limit)
 {
     // Answers to lock and unlock look alike: those that were given up come first.
+    IoResult finished;
     {
         const std::lock_guard sending(m_sending);
-        if (const IoResult result = m_channel.finishMessage(limit); result != IoResult::Done)
-            return transferStatus(result, limit);
+        finished = m_channel.finishMessage(limit);
+    }
+    if (finished != IoResult::Done) {
+        if (!call.request)
+            releaseLater(call.lastSentId);
+        return transferStatus(finished, limit);
     }
     payBack(limit.wakeup);
     const ViStatus settled = await(
         [this]() -> std::optional<ViStatus> {
-            return m_lockCalls.empty() && !m_lockToReturn ? std::optional<ViStatus>(VI_SUCCESS) : std::nullopt;
+            return m_lockCalls.empty() && m_locksToReturn.empty() ? std::optional<ViStatus>(VI_SUCCESS) : std::nullopt;
         },
         limit);
+    if (settled != VI_SUCCESS && !call.request)
+        releaseLater(call.lastSentId);
     if (settled != VI_SUCCESS)
         return settled == VI_ERROR_TMO && call.request ? VI_ERROR_RSRC_LOCKED : settled;
     {
@@ -158,6 +165,8 @@ ViStatus HislipAsyncChannel::lockCall(const Header &header, std::span<const std:
     const IoResult result = post(header, payload, begun, limit);
     if (result != IoResult::Done) {
         giveUpLockCall(begun);
+        if (!begun && !call.request)
+            releaseLater(call.lastSentId);
         return transferStatus(result, limit);
     }
     const ViStatus status = await(
@@ -199,6 +208,19 @@ void HislipAsyncChannel::giveUpLockCall(bool begun)
         startReading();
 }
 
+/// The caller takes the lock for released, so it has to be, sooner or later.
+void HislipAsyncChannel::releaseLater(std::uint32_t lastSentId)
+{
+    {
+        const std::lock_guard lock(m_mutex);
+        if (m_lost)
+            return;
+        m_locksToReturn.push_back(lastSentId);
+    }
+    if (!m_stop.closed())
+        startReading();
+}
+
 /// Returns a lock that came too late, unless that would have to wait: then the next request on its way out does it.
 void HislipAsyncChannel::payBack(const os::Wakeup &wakeup)
 {
@@ -208,10 +230,11 @@ void HislipAsyncChannel::payBack(const os::Wakeup &wakeup)
     std::uint32_t lastSentId = 0;
     {
         const std::lock_guard lock(m_mutex);
-        if (!m_lockToReturn)
+        // An answer that is still to come would look like that to this release.
+        if (m_locksToReturn.empty() || !m_lockCalls.empty())
             return;
-        lastSentId = *m_lockToReturn;
-        m_lockToReturn.reset();
+        lastSentId = m_locksToReturn.front();
+        m_locksToReturn.pop_front();
         m_lockCalls.push_back({false, true, lastSentId});
     }
     std::size_t sent = 0;
@@ -221,7 +244,7 @@ void HislipAsyncChannel::payBack(const os::Wakeup &wakeup)
         return;
     const std::lock_guard lock(m_mutex);
     m_lockCalls.pop_back();
-    m_lockToReturn = lastSentId;
+    m_locksToReturn.push_front(lastSentId);
 }
 
 std::optional<ViStatus> HislipAsyncChannel::answered(MessageType expected, Reply &reply)
@@ -263,6 +286,8 @@ void HislipAsyncChannel::forgetPast()
     const std::lock_guard lock(m_mutex);
     m_interrupted.clear();
     m_lockCalls.clear();
+    // Messages are counted anew: none of the new ones has to come before.
+    std::fill(m_locksToReturn.begin(), m_locksToReturn.end(), NothingSentId);
 }
 
 ViStatus HislipAsyncChannel::await(const Condition &condition, const os::WaitLimit &limit)
@@ -297,11 +322,16 @@ IoResult HislipAsyncChannel::receiveOne(const os::WaitLimit &limit)
     IoResult result = m_channel.next(header, limit);
     if (result == IoResult::Done)
         result = sort(header, limit);
-    if (result == IoResult::Closed) {
-        const std::lock_guard lock(m_mutex);
-        m_lost = true;
-    }
+    if (result == IoResult::Closed)
+        lose();
     return result;
+}
+
+void HislipAsyncChannel::lose()
+{
+    const std::lock_guard lock(m_mutex);
+    m_lost = true;
+    m_sawBadHeader = m_channel.sawBadHeader();
 }
 
 IoResult HislipAsyncChannel::sort(const Header &header, const os::WaitLimit &limit)
@@ -333,8 +363,11 @@ IoResult HislipAsyncChannel::sort(const Header &header, const os::WaitLimit &lim
         keepLockAnswer(header.control);
         payBack(limit.wakeup);
         break;
-    case MessageType::FatalError:
+    case MessageType::FatalError: {
+        const std::lock_guard lock(m_mutex);
+        m_fatalError = static_cast<FatalErrorCode>(header.control);
         return IoResult::Closed;
+    }
     default:
         if (isResponse(header.type) || header.type == MessageType::Error) {
             keepReply(header, payload);
@@ -386,7 +419,7 @@ void HislipAsyncChannel::keepLockAnswer(std::uint8_t control)
     if (!call.givenUp)
         m_lockAnswer = control;
     else if (call.request && control == LockGranted)
-        m_lockToReturn = call.lastSentId;
+        m_locksToReturn.push_back(call.lastSentId);
 }
 
 ViStatus HislipAsyncChannel::watch(std::function<void()> notify)
@@ -424,12 +457,29 @@ void HislipAsyncChannel::readForEver()
         } catch (const std::bad_alloc &) {
             result = IoResult::NoMemory;
         }
-        if (result != IoResult::Done) {
-            const std::lock_guard lock(m_mutex);
-            m_lost = true;
-        }
+        if (result != IoResult::Done)
+            lose();
         m_news.terminate();
     }
+}
+
+std::optional<FatalErrorCode> HislipAsyncChannel::fatalError()
+{
+    const std::lock_guard lock(m_mutex);
+    return m_fatalError;
+}
+
+bool HislipAsyncChannel::sawBadHeader()
+{
+    const std::lock_guard lock(m_mutex);
+    return m_sawBadHeader;
+}
+
+void HislipAsyncChannel::fail(FatalErrorCode code)
+{
+    const std::unique_lock sending(m_sending, std::try_to_lock);
+    if (sending && !m_channel.messageIsHalfSent())
+        m_channel.fail(code);
 }
 
 void HislipAsyncChannel::close()

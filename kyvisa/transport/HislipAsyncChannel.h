@@ -25,7 +25,7 @@ namespace kyvisa
  *
  * A response that came too late for its call is told from the next one by counting: requests of a type are answered in order.
  * A lock that is granted too late is given back at once, by whoever receives the grant; so that somebody does, a lock request
- * that is given up starts the thread.
+ * that is given up starts the thread. A release that could not leave in its time follows as soon as it can.
  */
 class HislipAsyncChannel
 {
@@ -64,6 +64,13 @@ public:
     /// Calls @p notify for each service request from now on.
     ViStatus watch(std::function<void()> notify);
 
+    /// Why the instrument ended the connection, where it said so.
+    std::optional<wire::hislip::FatalErrorCode> fatalError();
+    /// The connection was ended because of a header that made no sense.
+    bool sawBadHeader();
+    /// As HislipChannel::fail(), when nothing else is being sent.
+    void fail(wire::hislip::FatalErrorCode code);
+
     void setKeepAlive(bool on) { m_channel.socket().setKeepAlive(on); }
     void close();
     void abandon();
@@ -84,12 +91,14 @@ private:
     ViStatus lockCall(const wire::hislip::Header &header, std::span<const std::byte> payload, const LockCall &call,
                       std::uint8_t &control, const os::WaitLimit &limit);
     void giveUpLockCall(bool begun);
+    void releaseLater(std::uint32_t lastSentId);
     void payBack(const os::Wakeup &wakeup);
     os::IoResult receiveOne(const os::WaitLimit &limit);
     os::IoResult refuse(wire::hislip::MessageType type, const os::Wakeup &wakeup);
     os::IoResult sort(const wire::hislip::Header &header, const os::WaitLimit &limit);
     void keepReply(const wire::hislip::Header &header, const std::array<std::byte, 8> &payload);
     void keepLockAnswer(std::uint8_t control);
+    void lose();
     bool startReading();
     void readForEver();
     std::optional<ViStatus> answered(wire::hislip::MessageType expected, Reply &reply);
@@ -106,7 +115,9 @@ private:
     std::optional<Reply> m_reply;
     std::deque<LockCall> m_lockCalls;
     std::optional<std::uint8_t> m_lockAnswer;
-    std::optional<std::uint32_t> m_lockToReturn; ///< a lock was granted too late; the message to name in its release
+    std::deque<std::uint32_t> m_locksToReturn; ///< each by the message to name in its release
+    std::optional<wire::hislip::FatalErrorCode> m_fatalError;
+    bool m_sawBadHeader = false;
     std::deque<std::uint32_t> m_interrupted;
     bool m_lost = false;
 };

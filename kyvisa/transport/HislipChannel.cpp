@@ -44,6 +44,7 @@ IoResult HislipChannel::next(Header &header, const os::WaitLimit &limit)
     }
     const auto bytes = m_input.data().first<HeaderSize>();
     if (!decode(bytes, header) || !plausible(header)) {
+        m_sawBadHeader = true;
         fail(FatalErrorCode::BadHeader);
         return IoResult::Closed;
     }

@@ -52,6 +52,8 @@ public:
     /// Tells the peer that the connection is beyond repair, if that is possible without waiting, and ends it. The
     /// descriptor stays until close(): the other thread may be sending.
     void fail(wire::hislip::FatalErrorCode code);
+    /// A header made no sense. For the thread that receives.
+    bool sawBadHeader() const { return m_sawBadHeader; }
 
 private:
     bool plausible(const wire::hislip::Header &header) const;
@@ -62,6 +64,7 @@ private:
     std::array<std::byte, wire::hislip::HeaderSize> m_header{}; ///< of the message being sent
     std::size_t m_headerUnsent = 0;
     std::uint64_t m_payloadUnsent = 0;
+    bool m_sawBadHeader = false;
     std::vector<std::byte> m_shortPayload; ///< its last bytes are the unsent ones; empty for a long payload
 };
 

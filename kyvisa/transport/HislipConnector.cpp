@@ -24,11 +24,9 @@ constexpr std::uint8_t OverlapFlag = 1;
 constexpr std::uint8_t EncryptionFlags = 2 | 4; // mandatory, required at the beginning
 
 /// Why an instrument refused a session.
-ViStatus refusal(const Header &header)
+ViStatus refusal(FatalErrorCode code)
 {
-    if (header.type != MessageType::FatalError)
-        return VI_ERROR_RSRC_NFOUND;
-    switch (static_cast<FatalErrorCode>(header.control)) {
+    switch (code) {
     case FatalErrorCode::MaximumClients:
         return VI_ERROR_RSRC_BUSY;
     case FatalErrorCode::SecureConnectionFailed:
@@ -44,6 +42,12 @@ ViStatus whileOpening(ViStatus status)
     return status == VI_ERROR_CONN_LOST || status == VI_ERROR_IO ? VI_ERROR_RSRC_NFOUND : status;
 }
 
+ViStatus whileOpening(ViStatus status, HislipAsyncChannel &channel)
+{
+    const auto said = channel.fatalError();
+    return status == VI_ERROR_CONN_LOST && said ? refusal(*said) : whileOpening(status);
+}
+
 ViStatus initialize(HislipChannel &channel, const std::string &subAddress, Header &response, const os::WaitLimit &limit)
 {
     const Header request{MessageType::Initialize, 0, initializeParameter(Version1, VendorId), subAddress.size()};
@@ -53,8 +57,10 @@ ViStatus initialize(HislipChannel &channel, const std::string &subAddress, Heade
         result = channel.next(response, limit);
     if (result != IoResult::Done)
         return whileOpening(transferStatus(result, limit));
+    if (response.type == MessageType::FatalError)
+        return refusal(static_cast<FatalErrorCode>(response.control));
     if (response.type != MessageType::InitializeResponse)
-        return refusal(response);
+        return VI_ERROR_RSRC_NFOUND;
     if ((response.control & EncryptionFlags) != 0)
         return VI_ERROR_INV_PROT;
     return VI_SUCCESS;
@@ -88,16 +94,17 @@ ViStatus connectHislip(const ResourceName &name, const os::WaitLimit &limit, Att
     status = async->transact({MessageType::AsyncInitialize, 0, session, 0}, {}, MessageType::AsyncInitializeResponse,
                              reply, limit);
     if (status < VI_SUCCESS)
-        return whileOpening(status);
+        return whileOpening(status, *async);
 
     const bool overlapped = (response.control & OverlapFlag) != 0;
+    HislipAsyncChannel &asyncChannel = *async;
     auto hislip = std::make_unique<HislipTransport>(std::move(sync), std::move(async), overlapped);
     status = hislip->agreeOnSizes(attributes.number(VI_ATTR_TCPIP_HISLIP_MAX_MESSAGE_KB) * 1024, limit);
     if (status < VI_SUCCESS)
-        return whileOpening(status);
+        return whileOpening(status, asyncChannel);
     const std::uint32_t version = std::min<std::uint32_t>(response.parameter >> 16, Version1);
     attributes.setNumber(VI_ATTR_TCPIP_HISLIP_VERSION, (version >> 8) << 20 | (version & 0xFF) << 8);
-    attributes.setNumber(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, overlapped ? VI_TRUE : VI_FALSE);
+    hislip->showModeIn(attributes);
     transport = std::move(hislip);
     return VI_SUCCESS;
 }

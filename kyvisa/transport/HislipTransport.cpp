@@ -1,5 +1,6 @@
 #include "kyvisa/transport/HislipTransport.h"
 
+#include "kyvisa/core/AttributeStore.h"
 #include "kyvisa/include/visa.h"
 #include "kyvisa/transport/IoStatus.h"
 
@@ -24,6 +25,15 @@ constexpr std::uint8_t ExclusiveGranted = 1; ///< in AsyncLockInfoResponse
 constexpr std::chrono::milliseconds PatienceForCounterpart{2000};
 /// An instrument that takes nothing for so long does not look at its input.
 constexpr std::chrono::milliseconds PatienceForStillInput{500};
+
+/// And no more than a quarter of the call's time, or a clear would end before it has begun.
+os::Deadline stillInputSeen(os::Deadline deadline)
+{
+    const auto patience = os::Deadline::after(PatienceForStillInput);
+    return deadline.isNever() ? patience
+                              : patience.orEarlier(os::Deadline::after(
+                                    std::chrono::duration_cast<std::chrono::milliseconds>(deadline.remaining()) / 4));
+}
 /// For the question who holds a lock, behind a read that has timed out.
 constexpr std::chrono::milliseconds PatienceForLockInfo{200};
 
@@ -34,9 +44,16 @@ std::uint8_t control(auto code)
 
 } // namespace
 
-HislipTransport::HislipTransport(HislipChannel sync, std::unique_ptr<HislipAsyncChannel> async, bool overlapped)
-    : m_sync(std::move(sync)), m_async(std::move(async)), m_overlapped(overlapped)
+HislipTransport::HislipTransport(HislipChannel sync, std::unique_ptr<HislipAsyncChannel> async, bool overlapped,
+                                 std::chrono::milliseconds patienceForClear)
+    : m_sync(std::move(sync)), m_async(std::move(async)), m_overlapped(overlapped), m_patienceForClear(patienceForClear)
 {
+}
+
+void HislipTransport::showModeIn(AttributeStore &attributes)
+{
+    m_attributes = &attributes;
+    attributes.setNumber(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, m_overlapped ? VI_TRUE : VI_FALSE);
 }
 
 ViStatus HislipTransport::agreeOnSizes(ViUInt64 largestToUs, const os::WaitLimit &limit)
@@ -59,8 +76,14 @@ ViStatus HislipTransport::agreeOnSizes(ViUInt64 largestToUs, const os::WaitLimit
 
 ViStatus HislipTransport::checked(ViStatus status)
 {
-    if (status == VI_ERROR_CONN_LOST)
-        close();
+    if (status != VI_ERROR_CONN_LOST)
+        return status;
+    // What is wrong with one connection is told on both.
+    if (m_sync.sawBadHeader())
+        m_async->fail(FatalErrorCode::BadHeader);
+    else if (m_async->sawBadHeader())
+        m_sync.fail(FatalErrorCode::BadHeader);
+    close();
     return status;
 }
 
@@ -270,11 +293,14 @@ ViStatus HislipTransport::readStatusByte(const TransferMode &, const os::WaitLim
     if (!m_sync.isOpen())
         return VI_ERROR_CONN_LOST;
     const std::uint32_t id = m_overlapped ? m_lastDeliveredId : lastSentId();
+    const std::uint8_t delivered = takeDeliveredFlag();
     HislipAsyncChannel::Reply reply;
-    const ViStatus result = m_async->transact({MessageType::AsyncStatusQuery, takeDeliveredFlag(), id, 0}, {},
+    const ViStatus result = m_async->transact({MessageType::AsyncStatusQuery, delivered, id, 0}, {},
                                               MessageType::AsyncStatusResponse, reply, limit);
     if (result >= VI_SUCCESS)
         status = reply.header.control;
+    else if (result == VI_ERROR_TMO && !m_async->awaits(MessageType::AsyncStatusResponse)) // it never left
+        m_deliveredToReport = m_deliveredToReport || delivered != 0;
     return checked(result);
 }
 
@@ -328,19 +354,31 @@ ViStatus HislipTransport::clearInto(bool overlapped, const os::WaitLimit &limit)
     if (m_clearing == Clearing::No) {
         if (const IoResult finished = finishAsFarAsTaken(limit); finished != IoResult::Done)
             return ended(finished, limit);
+        m_clearDue = os::Deadline::after(m_patienceForClear);
         HislipAsyncChannel::Reply reply;
-        const ViStatus status = m_async->transact({MessageType::AsyncDeviceClear, 0, 0, 0}, {},
-                                                  MessageType::AsyncDeviceClearAcknowledge, reply, limit);
+        const ViStatus status =
+            m_async->transact({MessageType::AsyncDeviceClear, 0, 0, 0}, {}, MessageType::AsyncDeviceClearAcknowledge,
+                              reply, {limit.deadline.orEarlier(m_clearDue), limit.wakeup});
         const bool underWay = status == VI_SUCCESS || m_async->awaits(MessageType::AsyncDeviceClearAcknowledge);
         if (!underWay)
             return checked(status);
         m_clearing = status == VI_SUCCESS ? Clearing::Acknowledged : Clearing::Requested;
         m_clearIntoOverlap = overlapped;
         if (status < VI_SUCCESS)
-            return checked(status);
+            return whileClearing(status);
     }
     m_clearIntoOverlap = m_clearing == Clearing::Completed ? m_clearIntoOverlap : overlapped;
     return finishClear(limit);
+}
+
+/// An instrument that has left a clear unfinished for too long will not take anything else either.
+ViStatus HislipTransport::whileClearing(ViStatus status)
+{
+    if (status != VI_ERROR_TMO || !m_clearDue.expired())
+        return checked(status);
+    m_sync.fail(FatalErrorCode::Unidentified);
+    m_async->fail(FatalErrorCode::Unidentified);
+    return checked(VI_ERROR_CONN_LOST);
 }
 
 /// Finishes a message that stopped in the middle, as long as the instrument takes it. One that does not look at its input,
@@ -349,8 +387,7 @@ IoResult HislipTransport::finishAsFarAsTaken(const os::WaitLimit &limit)
 {
     for (;;) {
         const std::uint64_t before = m_sync.unsent();
-        const auto patience = os::Deadline::after(PatienceForStillInput);
-        const IoResult result = m_sync.finishMessage({limit.deadline.orEarlier(patience), limit.wakeup});
+        const IoResult result = m_sync.finishMessage({stillInputSeen(limit.deadline), limit.wakeup});
         if (result != IoResult::TimedOut || limit.deadline.expired())
             return result;
         if (m_sync.unsent() == before)
@@ -361,10 +398,17 @@ IoResult HislipTransport::finishAsFarAsTaken(const os::WaitLimit &limit)
 /// Goes on with a device clear that is under way, to its end.
 ViStatus HislipTransport::finishClear(const os::WaitLimit &limit)
 {
+    if (m_clearing == Clearing::No)
+        return VI_SUCCESS;
+    return whileClearing(goOnWithClear({limit.deadline.orEarlier(m_clearDue), limit.wakeup}));
+}
+
+ViStatus HislipTransport::goOnWithClear(const os::WaitLimit &limit)
+{
     if (m_clearing == Clearing::Requested) {
         const ViStatus status = m_async->awaitAnswers(MessageType::AsyncDeviceClearAcknowledge, limit);
         if (status < VI_SUCCESS)
-            return checked(status);
+            return status;
         m_clearing = Clearing::Acknowledged;
     }
     if (m_clearing == Clearing::Acknowledged) {
@@ -377,20 +421,20 @@ ViStatus HislipTransport::finishClear(const os::WaitLimit &limit)
         if (begun)
             m_clearing = Clearing::Completed;
         if (result != IoResult::Done)
-            return ended(result, limit);
+            return transferStatus(result, limit);
         m_inMessage = false;
     }
     if (m_clearing == Clearing::Completed) {
         if (const IoResult result = m_sync.finishMessage(limit); result != IoResult::Done)
-            return ended(result, limit);
+            return transferStatus(result, limit);
         Header header;
         for (bool first = true; header.type != MessageType::DeviceClearAcknowledge; first = false) {
             if (!first && limit.deadline.expired())
                 return VI_ERROR_TMO;
             if (const IoResult result = m_sync.next(header, limit); result != IoResult::Done)
-                return ended(result, limit);
+                return transferStatus(result, limit);
             if (header.type == MessageType::FatalError)
-                return checked(VI_ERROR_CONN_LOST);
+                return VI_ERROR_CONN_LOST;
         }
         cleared((header.control & OverlapFlag) != 0);
     }
@@ -401,6 +445,8 @@ void HislipTransport::cleared(bool overlapped)
 {
     m_clearing = Clearing::No;
     m_overlapped = overlapped;
+    if (m_attributes)
+        showModeIn(*m_attributes);
     m_inMessage = false;
     m_nextId = FirstMessageId;
     m_lastDeliveredId = NothingSentId;
@@ -432,9 +478,13 @@ ViStatus HislipTransport::applyAttribute(ViAttr attribute, ViUInt64 value, const
     case VI_ATTR_TCPIP_HISLIP_MAX_MESSAGE_KB:
         return agreeOnSizes(value * 1024, limit);
     case VI_ATTR_TCPIP_HISLIP_OVERLAP_EN: {
-        if (on == m_overlapped)
+        if (on == m_overlapped && m_clearing == Clearing::No)
             return VI_SUCCESS;
-        const ViStatus status = clearInto(on, limit);
+        // A clear whose end was sent already may be going into the other mode.
+        const bool another = m_clearing == Clearing::Completed && on != m_clearIntoOverlap;
+        ViStatus status = clearInto(on, limit);
+        if (status == VI_SUCCESS && another)
+            status = clearInto(on, limit);
         return status == VI_SUCCESS && m_overlapped != on ? VI_ERROR_NSUP_ATTR_STATE : status;
     }
     default:

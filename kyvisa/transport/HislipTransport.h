@@ -18,14 +18,19 @@ namespace kyvisa
  * order until they are read.
  *
  * A device clear that ran into its time-out is finished before anything else is sent or read: until the instrument has seen
- * its end, it discards what comes.
+ * its end, it discards what comes. An instrument that does not do its part within a minute has lost the connection.
  *
  * The synchronous connection belongs to the calling thread. See HislipAsyncChannel for the other one.
  */
 class HislipTransport : public Transport
 {
 public:
-    HislipTransport(HislipChannel sync, std::unique_ptr<HislipAsyncChannel> async, bool overlapped);
+    /// @param patienceForClear from the beginning of a device clear to its end; IVI-6.1 suggests 40 to 120 seconds.
+    HislipTransport(HislipChannel sync, std::unique_ptr<HislipAsyncChannel> async, bool overlapped,
+                    std::chrono::milliseconds patienceForClear = std::chrono::seconds(60));
+
+    /// Keeps VI_ATTR_TCPIP_HISLIP_OVERLAP_EN true from now on. @p attributes outlives this object.
+    void showModeIn(AttributeStore &attributes);
 
     /// Tells each other the largest message.
     ViStatus agreeOnSizes(ViUInt64 largestToUs, const os::WaitLimit &limit);
@@ -57,6 +62,8 @@ private:
     ViStatus clearInto(bool overlapped, const os::WaitLimit &limit);
     os::IoResult finishAsFarAsTaken(const os::WaitLimit &limit);
     ViStatus finishClear(const os::WaitLimit &limit);
+    ViStatus goOnWithClear(const os::WaitLimit &limit);
+    ViStatus whileClearing(ViStatus status);
     void cleared(bool overlapped);
     ViStatus readResponse(std::span<std::byte> buffer, const TransferMode &mode, const os::WaitLimit &limit,
                           std::size_t &count);
@@ -93,6 +100,9 @@ private:
     os::Deadline m_counterpartDue = os::Deadline::never();
     Clearing m_clearing = Clearing::No;
     bool m_clearIntoOverlap = false;
+    const std::chrono::milliseconds m_patienceForClear;
+    os::Deadline m_clearDue = os::Deadline::never();
+    AttributeStore *m_attributes = nullptr;
 
     bool m_holdsExclusive = false; ///< of the instrument's locks
     bool m_holdsShared = false;

@@ -130,6 +130,30 @@ TEST(HislipHostile, GoesOnAfterAMessageThatIsNotUnderstood)
     viClose(session.vi);
 }
 
+TEST(HislipHostile, BadHeaderIsToldOnBothConnections)
+{
+    for (const bool onSync : {true, false}) {
+        ScriptedPeer peer([&](ScriptedPeer &self) {
+            HislipConnections client = acceptHislip(self);
+            client.async.expect(hex("48531500 FFFFFEFE 0000000000000000"));
+            (onSync ? client.sync : client.async).send(std::string(16, 'x'));
+            if (onSync)
+                client.async.send(hex("48531600 00000000 0000000000000000"));
+            for (test::PeerConnection *connection : {&client.sync, &client.async}) {
+                connection->expect(hex("48530201 00000000 0000000000000000"));
+                connection->expectClosed();
+            }
+        });
+        VisaSession session;
+        ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+        session.set(VI_ATTR_TMO_VALUE, 20000);
+        ViUInt16 status = 0;
+        EXPECT_EQ(viReadSTB(session.vi, &status), onSync ? VI_SUCCESS : VI_ERROR_CONN_LOST);
+        EXPECT_EQ(session.read(), VI_ERROR_CONN_LOST);
+        viClose(session.vi);
+    }
+}
+
 TEST(HislipHostile, TrickleDoesNotStretchTheTimeOut)
 {
     ScriptedPeer peer([](ScriptedPeer &self) {
@@ -156,6 +180,7 @@ TEST(HislipHostile, GarbageOnTheAsynchronousConnectionEndsTheSession)
             HislipConnections client = acceptHislip(self);
             client.async.expect(hex("48531500 FFFFFEFE 0000000000000000"));
             client.async.send("this is no HiSLIP header, is it?");
+            client.sync.expect(hex("48530201 00000000 0000000000000000"));
             client.sync.expectClosed();
         });
         VisaSession session;
@@ -179,6 +204,7 @@ TEST(HislipHostile, NonsenseThatAThreadReadsDoesNotMeetWhatTheCallerSends)
         for (int i = 0; i < 200; ++i)
             client.async.trySend(hex("4853FE00 00000000 0000000000000000") + hex("48531642 00000000 0000000000000000"));
         client.async.trySend("this is no HiSLIP header, is it?");
+        client.sync.expect(hex("48530201 00000000 0000000000000000"));
         client.sync.expectClosed();
     });
     VisaSession session;

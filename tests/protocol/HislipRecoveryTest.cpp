@@ -133,6 +133,82 @@ TEST(HislipRecovery, ClearOfAnInstrumentThatDoesNotLookAtItsInputIsAskedForFirst
         });
 }
 
+TEST(HislipRecovery, ShortTimeOutIsEnoughToAskForAClear)
+{
+    std::atomic<bool> asked{false};
+    converse(
+        [&](HislipConnections &client) {
+            client.async.expect(hex("48531300 00000000 0000000000000000")); // the input has not been touched
+            asked = true;
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+            client.sync.expect(hex("48530600 FFFFFF00 00000000000FFFF0"));
+            client.sync.take(0xFFFF0);
+            std::string header;
+            while ((header = client.sync.take(16))[2] != '\x08')
+                client.sync.take(0xFFFF0);
+            client.sync.send(hex("48530900 00000000 0000000000000000"));
+        },
+        [&](VisaSession &session) {
+            session.set(VI_ATTR_TMO_VALUE, 400); // shorter than what an instrument is given to look at its input
+            EXPECT_EQ(session.write(std::string(64'000'000, 'b')), VI_ERROR_TMO);
+            ViStatus status = VI_ERROR_TMO;
+            while (!asked && status == VI_ERROR_TMO)
+                status = viClear(session.vi);
+            session.set(VI_ATTR_TMO_VALUE, 30000);
+            EXPECT_EQ(status == VI_ERROR_TMO ? viClear(session.vi) : status, VI_SUCCESS);
+        });
+}
+
+TEST(HislipRecovery, ModeThatIsTakenBackBehindATimeOutIsTheLastOneAskedFor)
+{
+    std::atomic<bool> timedOut{false};
+    converse(
+        [&](HislipConnections &client) {
+            client.async.expect(hex("48531300 00000000 0000000000000000"));
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+            client.sync.expect(hex("48530801 00000000 0000000000000000")); // asks for overlap
+            while (!timedOut)
+                std::this_thread::yield();
+            client.sync.send(hex("48530901 00000000 0000000000000000"));
+            client.async.expect(hex("48531300 00000000 0000000000000000")); // and back
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+            client.sync.expect(hex("48530800 00000000 0000000000000000"));
+            client.sync.send(hex("48530900 00000000 0000000000000000"));
+        },
+        [&](VisaSession &session) {
+            session.set(VI_ATTR_TMO_VALUE, 50);
+            EXPECT_EQ(session.set(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, VI_TRUE), VI_ERROR_TMO);
+            session.set(VI_ATTR_TMO_VALUE, 20000);
+            timedOut = true;
+            EXPECT_EQ(session.set(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, VI_FALSE), VI_SUCCESS);
+            EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN), VI_FALSE);
+        });
+}
+
+TEST(HislipRecovery, ModeThatIsReachedBehindATimeOutIsShown)
+{
+    std::atomic<bool> timedOut{false};
+    converse(
+        [&](HislipConnections &client) {
+            client.async.expect(hex("48531300 00000000 0000000000000000"));
+            while (!timedOut)
+                std::this_thread::yield();
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+            client.sync.expect(hex("48530801 00000000 0000000000000000"));
+            client.sync.send(hex("48530901 00000000 0000000000000000"));
+            client.sync.expect(hex("48530700 FFFFFF00 0000000000000001") + "x");
+        },
+        [&](VisaSession &session) {
+            session.set(VI_ATTR_TMO_VALUE, 50);
+            EXPECT_EQ(session.set(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN, VI_TRUE), VI_ERROR_TMO);
+            EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN), VI_FALSE);
+            session.set(VI_ATTR_TMO_VALUE, 20000);
+            timedOut = true;
+            EXPECT_EQ(session.write("x"), VI_SUCCESS);
+            EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN), VI_TRUE);
+        });
+}
+
 TEST(HislipRecovery, InterruptedWithoutItsCounterpartDoesNotStopTheWritesForEver)
 {
     converse(

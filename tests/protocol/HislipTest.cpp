@@ -653,6 +653,41 @@ INSTANTIATE_TEST_SUITE_P(
                     Refusal{"Closed", "", VI_ERROR_RSRC_NFOUND}),
     [](const auto &row) { return std::string(row.param.name); });
 
+/// The answer to the introduction of the second connection instead.
+class HislipLateRefusal : public testing::TestWithParam<Refusal>
+{
+};
+
+TEST_P(HislipLateRefusal, EndsTheOpenPromptly)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        test::PeerConnection sync = self.accept();
+        sync.expect(hex("48530000 01005A5A 0000000000000007") + "hislip0");
+        sync.send(hex("48530100 01001234 0000000000000000"));
+        test::PeerConnection async = self.accept();
+        async.expect(hex("48531100 00001234 0000000000000000"));
+        async.send(GetParam().answer);
+        async.takeUntilClosed(24); // it may already be asking for the largest message
+        async.expectClosed();
+        sync.expectClosed();
+    });
+    VisaSession session;
+    const Stopwatch watch;
+    EXPECT_EQ(session.open(resource(peer), 30000), GetParam().expected);
+    EXPECT_LT(watch.milliseconds(), 10000);
+    EXPECT_EQ(session.vi, VI_NULL);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    All, HislipLateRefusal,
+    testing::Values(Refusal{"FatalError", hex("48530203 00000000 0000000000000000"), VI_ERROR_RSRC_NFOUND},
+                    Refusal{"TooManyClients", hex("48530204 00000000 0000000000000000"), VI_ERROR_RSRC_BUSY},
+                    Refusal{"NeedsSecureConnection", hex("48530205 00000000 0000000000000000"), VI_ERROR_INV_PROT},
+                    Refusal{"TooManyClientsBehindTheAnswer",
+                            hex("48531200 00005858 0000000000000000") + hex("48530204 00000000 0000000000000000"),
+                            VI_ERROR_RSRC_BUSY}),
+    [](const auto &row) { return std::string(row.param.name); });
+
 TEST(Hislip, SomethingElseAnswersOnThePort)
 {
     ScriptedPeer peer([](ScriptedPeer &self) {

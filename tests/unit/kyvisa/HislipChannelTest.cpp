@@ -174,12 +174,66 @@ TEST_F(HislipCut, LockRequestThatWasCutIsGivenBackWhenItIsGranted)
     channel.close();
 }
 
+TEST_F(HislipCut, ReleaseThatNeverLeftFollowsBehindTheNextRequest)
+{
+    const Line line;
+    HislipAsyncChannel channel(line.near());
+    test::PeerConnection peer = line.far();
+    std::uint8_t control = 0;
+    peer.send(hex("48530501 00000000 0000000000000000"));
+    ASSERT_EQ(channel.requestLock(std::chrono::milliseconds(7), {}, 0xFFFFFF00, control, within(20000)), VI_SUCCESS);
+
+    g_room = 0;
+    EXPECT_EQ(channel.releaseLock(0xFFFFFF02, control, within(20)), VI_ERROR_TMO);
+    g_room = Unlimited;
+    std::thread instrument([&] {
+        peer.expect(hex("48530401 00000007 0000000000000000"));
+        peer.expect(hex("48530400 FFFFFF02 0000000000000000")); // or the lock would be nobody's for ever
+        peer.send(hex("48530501 00000000 0000000000000000"));
+        peer.expect(hex("48530401 00000008 0000000000000000"));
+        peer.send(hex("48530501 00000000 0000000000000000"));
+    });
+    EXPECT_EQ(channel.requestLock(std::chrono::milliseconds(8), {}, 0xFFFFFF02, control, within(20000)), VI_SUCCESS);
+    instrument.join();
+    channel.close();
+}
+
+TEST_F(HislipCut, ReleaseBehindAnUnansweredRequestWaitsForItsAnswer)
+{
+    const Line line;
+    HislipAsyncChannel channel(line.near());
+    test::PeerConnection peer = line.far();
+    std::uint8_t control = 0;
+    const std::array key = {std::byte{'k'}};
+    peer.send(hex("48530501 00000000 0000000000000000"));
+    ASSERT_EQ(channel.requestLock(std::chrono::milliseconds(7), key, 0xFFFFFF00, control, within(20000)), VI_SUCCESS);
+    EXPECT_NE(channel.requestLock(std::chrono::milliseconds(9), {}, 0xFFFFFF00, control, within(20)), VI_SUCCESS);
+    EXPECT_EQ(channel.releaseLock(0xFFFFFF02, control, within(20)), VI_ERROR_TMO);
+    channel.forgetPast(); // a device clear: both counts begin anew, and what is owed stays owed
+    std::thread instrument([&] {
+        peer.expect(hex("48530401 00000007 0000000000000001") + "k" + hex("48530401 00000009 0000000000000000") +
+                    hex("48531500 00000000 0000000000000000") + hex("48530400 FFFFFEFE 0000000000000000"));
+        peer.send(hex("48531600 00000000 0000000000000000"));
+    });
+    HislipAsyncChannel::Reply reply;
+    EXPECT_EQ(channel.transact({MessageType::AsyncStatusQuery, 0, 0, 0}, {}, MessageType::AsyncStatusResponse, reply,
+                               within(20000)),
+              VI_SUCCESS);
+    instrument.join();
+    channel.close();
+}
+
 /// A session whose two connections end in this test.
 struct Session {
+    explicit Session(std::chrono::milliseconds patienceForClear = std::chrono::seconds(60))
+        : transport(HislipChannel(syncLine.near(), 1024), std::make_unique<HislipAsyncChannel>(asyncLine.near()), false,
+                    patienceForClear)
+    {
+    }
+
     Line syncLine;
     Line asyncLine;
-    HislipTransport transport{HislipChannel(syncLine.near(), 1024),
-                              std::make_unique<HislipAsyncChannel>(asyncLine.near()), false};
+    HislipTransport transport;
     test::PeerConnection sync = syncLine.far();
     test::PeerConnection async = asyncLine.far();
 };
@@ -215,6 +269,44 @@ TEST_F(HislipCut, MessageThatNeverLeftHasNotUsedUpItsNumberNorTheWordOfDelivery)
     EXPECT_EQ(session.transport.write(bytes("x"), {}, within(20000), count), VI_SUCCESS);
     session.sync.expect(hex("48530700 FFFFFF00 0000000000000001") + "?" + hex("48530701 FFFFFF02 0000000000000001") +
                         "x");
+}
+
+TEST_F(HislipCut, StatusQueryThatNeverLeftHasNotUsedUpTheWordOfDelivery)
+{
+    Session session;
+    agreeOnSizes(session, within(20000));
+    std::array<std::byte, 4> answer;
+    std::size_t count = 0;
+    session.sync.send(hex("48530700 FFFFFEFE 0000000000000001") + "!");
+    ASSERT_EQ(session.transport.read(answer, {}, within(20000), count), VI_SUCCESS);
+
+    g_room = 0;
+    ViUInt16 status = 0;
+    EXPECT_EQ(session.transport.readStatusByte({}, within(20), status), VI_ERROR_TMO);
+    g_room = Unlimited;
+    count = 0;
+    EXPECT_EQ(session.transport.write(bytes("x"), {}, within(20000), count), VI_SUCCESS);
+    session.sync.expect(hex("48530701 FFFFFF00 0000000000000001") + "x");
+}
+
+TEST_F(HislipCut, ClearThatIsNeverAnsweredIsALostConnectionInTheEnd)
+{
+    for (const bool acknowledged : {false, true}) {
+        Session session(std::chrono::milliseconds(acknowledged ? 2000 : 1));
+        agreeOnSizes(session, within(20000));
+        session.async.expect(hex("48530F00 00000000 0000000000000008 0000000000100000"));
+        if (acknowledged)
+            session.async.send(hex("48531700 00000000 0000000000000000"));
+        ViStatus status = session.transport.clear(within(20));
+        for (int i = 0; i < 1000 && status == VI_ERROR_TMO; ++i)
+            status = session.transport.clear(within(20));
+        EXPECT_EQ(status, VI_ERROR_CONN_LOST);
+        session.async.expect(hex("48531300 00000000 0000000000000000") + hex("48530200 00000000 0000000000000000"));
+        if (acknowledged)
+            session.sync.expect(hex("48530800 00000000 0000000000000000"));
+        session.sync.expect(hex("48530200 00000000 0000000000000000"));
+        session.sync.expectClosed();
+    }
 }
 
 TEST_F(HislipCut, MessageThatWasCutHasUsedUpItsNumber)
