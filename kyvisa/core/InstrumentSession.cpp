@@ -134,8 +134,16 @@ template <typename Operation>
 ViStatus InstrumentSession::perform(os::Deadline deadline, const Operation &operation)
 {
     const CallWatch watch(m_interruptions);
-    const ViStatus status = mayTransfer();
-    return status == VI_SUCCESS ? inTurn(deadline, watch, operation) : status;
+    if (const ViStatus status = mayTransfer(); status != VI_SUCCESS)
+        return status;
+    bool waited = false;
+    if (const ViStatus status = entered(m_gate.enter(deadline, &waited), watch); status != VI_SUCCESS)
+        return status;
+    const GateTurn turn(m_gate);
+    // Another session may have got its lock meanwhile.
+    if (const ViStatus status = waited ? mayTransfer() : VI_SUCCESS; status != VI_SUCCESS)
+        return status;
+    return operation(os::WaitLimit{deadline, m_wakeup});
 }
 
 template <typename Operation>
@@ -223,6 +231,8 @@ ViStatus InstrumentSession::carryOut(const AsyncTransfers::Job &job, const std::
     const AsyncTransfers::Talking talking(m_jobs);
     if (cancelled.load())
         return VI_ERROR_ABORT;
+    if (const ViStatus status = mayTransfer(); status != VI_SUCCESS)
+        return status;
     const os::WaitLimit limit{deadline, m_wakeup};
     return job.reads ? m_transport->read(job.buffer, transferMode(), limit, count)
                      : transfer(job.buffer, true, limit, count);
@@ -488,6 +498,7 @@ void InstrumentSession::abandon()
 {
     if (m_transport)
         m_transport->abandon();
+    m_wakeup.abandon();
 }
 
 } // namespace kyvisa

@@ -5,10 +5,13 @@
 namespace kyvisa
 {
 
-IoGate::Entered IoGate::enter(os::Deadline deadline)
+IoGate::Entered IoGate::enter(os::Deadline deadline, bool *waited)
 {
     std::unique_lock lock(m_mutex);
-    if (!m_closed && (m_busy || !m_line.empty()))
+    const bool waits = !m_closed && (m_busy || !m_line.empty());
+    if (waited)
+        *waited = waits;
+    if (waits)
         return waitInLine(lock, join(), deadline, nullptr);
     if (m_closed)
         return Entered::Closed;

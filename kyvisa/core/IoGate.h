@@ -24,7 +24,8 @@ public:
     enum class Entered { Yes, TimedOut, Closed, Cancelled };
     using Place = std::uint64_t;
 
-    Entered enter(os::Deadline deadline);
+    /// @param waited set to true when somebody else had the turn at first.
+    Entered enter(os::Deadline deadline, bool *waited = nullptr);
     void leave();
 
     /// Takes the last place in the line, for one enterAt() or giveUp().

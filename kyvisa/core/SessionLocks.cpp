@@ -104,11 +104,14 @@ ViStatus SessionLocks::lockInDevice(ViAccessMode type, os::Deadline deadline, bo
         [&] { return count(type, key, granted); });
 }
 
-/// Asks until the instrument grants the lock or the time is up. @p before may settle it each time the turn has come.
+/// Asks until the instrument grants the lock or the time is up. @p before may settle it at first and each time the turn has come.
 ViStatus SessionLocks::askDevice(const std::string &key, os::Deadline deadline, bool immediate, const CallWatch &watch,
                                  const std::function<std::optional<ViStatus>()> &before,
                                  const std::function<ViStatus()> &granted)
 {
+    // What needs no instrument does not wait for the turn.
+    if (const auto settled = before())
+        return *settled;
     for (;;) {
         bool refused = false;
         const auto enterBy = immediate ? os::Deadline::after(WayBack) : deadline;
@@ -192,32 +195,41 @@ ViStatus SessionLocks::unlock()
     return inDevice < VI_SUCCESS ? inDevice : onMachine;
 }
 
+/// As judge(), for an unlock.
+std::optional<ViStatus> SessionLocks::judgeUnlock()
+{
+    const std::lock_guard lock(m_mutex);
+    if (m_counts.exclusive + m_counts.shared == 0)
+        return VI_ERROR_SESN_NLOCKED;
+    int &nested = m_counts.exclusive > 0 ? m_counts.exclusive : m_counts.shared;
+    if (nested == 1)
+        return std::nullopt;
+    --nested;
+    return m_counts.exclusive > 0 ? VI_SUCCESS_NESTED_EXCLUSIVE : VI_SUCCESS_NESTED_SHARED;
+}
+
 ViStatus SessionLocks::unlockInDevice()
 {
-    {
-        const std::lock_guard lock(m_mutex);
-        if (m_counts.exclusive + m_counts.shared == 0)
-            return VI_ERROR_SESN_NLOCKED;
-        int &nested = m_counts.exclusive > 0 ? m_counts.exclusive : m_counts.shared;
-        if (nested > 1) {
-            --nested;
-            return m_counts.exclusive > 0 ? VI_SUCCESS_NESTED_EXCLUSIVE : VI_SUCCESS_NESTED_SHARED;
-        }
-    }
+    if (const auto settled = judgeUnlock())
+        return *settled;
     return m_turn(os::Deadline::after(WayBack), [this](Transport &transport, const os::Wakeup &wakeup) -> ViStatus {
+        if (const auto settled = judgeUnlock()) // another thread has unlocked while this one waited
+            return *settled;
+        // Given back or lost with the connection: in neither case is it held any more, and nobody nests in it meanwhile.
+        const ViStatus left = countDown();
         const ViStatus released = transport.unlockDevice({os::Deadline::after(WayBack), wakeup});
-        const std::lock_guard lock(m_mutex);
-        // Given back or lost with the connection: in neither case is it held any more.
-        if (m_counts.exclusive > 0)
-            --m_counts.exclusive;
-        else if (m_counts.shared > 0)
-            --m_counts.shared;
-        if (released < VI_SUCCESS)
-            return released;
-        if (m_counts.exclusive > 0)
-            return VI_SUCCESS_NESTED_EXCLUSIVE;
-        return m_counts.shared > 0 ? VI_SUCCESS_NESTED_SHARED : VI_SUCCESS;
+        return released < VI_SUCCESS ? released : left;
     });
+}
+
+/// The session holds one lock less. @return what viUnlock() answers for that.
+ViStatus SessionLocks::countDown()
+{
+    const std::lock_guard lock(m_mutex);
+    --(m_counts.exclusive > 0 ? m_counts.exclusive : m_counts.shared);
+    if (m_counts.exclusive > 0)
+        return VI_SUCCESS_NESTED_EXCLUSIVE;
+    return m_counts.shared > 0 ? VI_SUCCESS_NESTED_SHARED : VI_SUCCESS;
 }
 
 bool SessionLocks::shutOut() const

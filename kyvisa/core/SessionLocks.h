@@ -76,6 +76,8 @@ private:
     ViStatus count(ViAccessMode type, const std::string &key, std::string &granted);
     ViStatus lockOnTop(ViUInt32 timeout, const CallWatch &watch);
     ViStatus unlockInDevice();
+    std::optional<ViStatus> judgeUnlock();
+    ViStatus countDown();
     ViStatus askDevice(const std::string &key, os::Deadline deadline, bool immediate, const CallWatch &watch,
                        const std::function<std::optional<ViStatus>()> &before,
                        const std::function<ViStatus()> &granted);

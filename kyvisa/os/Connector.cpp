@@ -20,7 +20,10 @@ constexpr std::chrono::milliseconds HeadStart{250};
 class Race
 {
 public:
-    explicit Race(std::vector<Address> addresses) : m_addresses(std::move(addresses)) {}
+    explicit Race(std::vector<Address> addresses) : m_addresses(std::move(addresses))
+    {
+        m_running.reserve(m_addresses.size()); // so that a new descriptor always finds its place
+    }
     ~Race()
     {
         for (const int descriptor : m_running)

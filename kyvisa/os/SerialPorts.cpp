@@ -34,8 +34,11 @@ std::map<std::string, std::string> stableNames(const std::string &root)
          entry.increment(error)) {
         std::error_code broken;
         const fs::path target = fs::read_symlink(entry->path(), broken);
-        if (!broken)
-            names.emplace(target.filename().string(), entry->path().filename().string());
+        if (broken)
+            continue;
+        const std::string name = entry->path().filename().string();
+        std::string &kept = names.try_emplace(target.filename().string(), name).first->second;
+        kept = std::min(kept, name); // the folder's own order is none
     }
     return names;
 }

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <sys/eventfd.h>
 #include <unistd.h>
+#include <utility>
 
 namespace kyvisa::os
 {
@@ -13,8 +14,13 @@ Wakeup::Wakeup() : m_descriptor(systemCalls().eventfd(0, EFD_CLOEXEC | EFD_NONBL
 
 Wakeup::~Wakeup()
 {
+    abandon();
+}
+
+void Wakeup::abandon()
+{
     if (valid())
-        systemCalls().close(m_descriptor);
+        systemCalls().close(std::exchange(m_descriptor, -1));
 }
 
 void Wakeup::signal() const

@@ -24,6 +24,8 @@ public:
 
     void terminate();
     void close();
+    /// In a forked child: frees the descriptor. Nothing is woken by this object any more.
+    void abandon();
     bool closed() const { return m_closed.load(std::memory_order_acquire); }
     bool raised() const { return closed() || m_terminated.load(std::memory_order_acquire); }
 

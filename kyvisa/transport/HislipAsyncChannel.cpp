@@ -496,6 +496,8 @@ void HislipAsyncChannel::abandon()
 {
     static_cast<void>(m_thread.release()); // the thread is in another process: neither to be joined nor to be destroyed
     m_channel.close();
+    m_stop.abandon();
+    m_news.abandon();
 }
 
 } // namespace kyvisa

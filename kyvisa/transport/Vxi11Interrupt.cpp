@@ -40,6 +40,7 @@ void Vxi11Interrupt::abandon()
     m_listener.close();
     for (Channel &channel : m_channels)
         channel.socket.close();
+    m_stop.abandon();
 }
 
 bool Vxi11Interrupt::start(std::uint32_t address)

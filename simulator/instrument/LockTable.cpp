@@ -50,7 +50,7 @@ void LockTable::request(Owner owner, const std::string &key, std::chrono::millis
     const bool held = m_exclusive == owner || (!key.empty() && client.shares);
     if (held || waitOf(owner) != m_waits.end())
         return told(Answer::Error);
-    if (grant(owner, key))
+    if (!overtakes(key) && grant(owner, key))
         return told(Answer::Granted);
     if (timeout.count() <= 0)
         return told(Answer::Failed);
@@ -88,21 +88,32 @@ LockTable::Released LockTable::release(Owner owner)
     return Released::Shared;
 }
 
-bool LockTable::grant(Owner owner, const std::string &key)
+bool LockTable::isFree(Owner owner, const std::string &key) const
 {
     if (m_exclusive != NoOwner)
         return false;
-    Client &client = m_clients.at(owner);
+    return m_sharers == 0 || (key.empty() ? m_clients.at(owner).shares : key == m_key);
+}
+
+/// The lock has come free for somebody who waits, and the word of it is still on its way.
+bool LockTable::overtakes(const std::string &key) const
+{
+    return std::any_of(m_waits.begin(), m_waits.end(), [&](const Wait &wait) {
+        const bool together = !key.empty() && wait.key == key;
+        return !together && isFree(wait.owner, wait.key);
+    });
+}
+
+bool LockTable::grant(Owner owner, const std::string &key)
+{
+    if (!isFree(owner, key))
+        return false;
     if (key.empty()) {
-        if (m_sharers > 0 && !client.shares)
-            return false;
         m_exclusive = owner;
         return true;
     }
-    if (m_sharers > 0 && key != m_key)
-        return false;
     m_key = key;
-    client.shares = true;
+    m_clients.at(owner).shares = true;
     ++m_sharers;
     return true;
 }

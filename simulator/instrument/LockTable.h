@@ -65,7 +65,9 @@ private:
 
     void tell(Owner owner, const std::string &key, Answer answer) const;
     void tellRelease(Owner owner, const std::string &key) const;
+    bool isFree(Owner owner, const std::string &key) const;
     bool grant(Owner owner, const std::string &key);
+    bool overtakes(const std::string &key) const;
     void changed();
     void tellChange();
     std::list<Wait>::iterator waitOf(Owner owner);

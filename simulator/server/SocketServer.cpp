@@ -31,6 +31,8 @@ public:
     ~Client() { m_server.m_instrument.locks.leave(m_lockOwner); }
 
     bool isSilent() const { return m_silent; }
+    /// Has said all, and is there for nothing but answers that it does not read.
+    bool isLeaving() const { return m_connection.inputEnded(); }
     std::uint64_t number() const { return m_number; }
 
 private:
@@ -97,11 +99,14 @@ SocketServer::~SocketServer() = default;
 void SocketServer::accept(FileDescriptor socket)
 {
     if (m_clients.size() >= m_maxClients) {
-        const auto silent =
+        auto dispensable =
             std::find_if(m_clients.begin(), m_clients.end(), [](const auto &each) { return each.second->isSilent(); });
-        if (silent == m_clients.end())
+        if (dispensable == m_clients.end())
+            dispensable = std::find_if(m_clients.begin(), m_clients.end(),
+                                       [](const auto &each) { return each.second->isLeaving(); });
+        if (dispensable == m_clients.end())
             return; // closes it
-        forget(*silent->second);
+        forget(*dispensable->second);
     }
     const std::uint64_t number = ++m_lastClient;
     m_clients.emplace(number, std::make_shared<Client>(*this, std::move(socket), number));

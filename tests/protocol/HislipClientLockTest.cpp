@@ -1,6 +1,7 @@
 // HiSLIP locks, seen from the client: what goes to the instrument, what is only counted, and what becomes of an answer that
 // comes too late. The bytes are those of the tables of IVI-6.1.
 #include "support/HislipPeer.h"
+#include "support/QuietFork.h"
 #include "support/Stopwatch.h"
 #include "support/VisaSession.h"
 
@@ -265,6 +266,72 @@ TEST(HislipLocking, WaitWhileOpeningEndsWithTheTimeOutOfTheWholeCall)
     EXPECT_EQ(session.open(resource(peer), 700, VI_EXCLUSIVE_LOCK), VI_ERROR_RSRC_LOCKED);
     EXPECT_GE(watch.milliseconds(), 700);
     EXPECT_LT(watch.milliseconds(), 10000);
+}
+
+TEST(HislipLocking, NestedLockDoesNotWaitForAnotherThreadsRead)
+{
+    std::atomic<bool> nested{false};
+    converse(
+        [&](HislipConnections &client) {
+            client.async.expect(hex("48530401 00000000 0000000000000000"));
+            client.async.send(Granted);
+            while (!nested)
+                std::this_thread::yield();
+            client.sync.send(hex("48530700 FFFFFEFE 0000000000000001") + "!");
+        },
+        [&](VisaSession &session) {
+            ASSERT_EQ(lockExclusively(session, VI_TMO_IMMEDIATE), VI_SUCCESS);
+            std::atomic<pid_t> reader{0};
+            std::thread reading([&] {
+                reader = ::gettid();
+                ViByte byte = 0;
+                EXPECT_EQ(viRead(session.vi, &byte, 1, nullptr), VI_SUCCESS);
+            });
+            while (reader == 0)
+                std::this_thread::yield();
+            test::awaitWaiting(reader);
+            EXPECT_EQ(lockExclusively(session, VI_TMO_IMMEDIATE), VI_SUCCESS_NESTED_EXCLUSIVE);
+            EXPECT_EQ(viUnlock(session.vi), VI_SUCCESS_NESTED_EXCLUSIVE);
+            nested = true;
+            reading.join();
+        });
+}
+
+TEST(HislipLocking, TwoThreadsThatUnlockAtOnceGiveBackTwoLocks)
+{
+    std::atomic<pid_t> second{0};
+    std::atomic<bool> asked{false};
+    converse(
+        [&](HislipConnections &client) {
+            client.async.expect(hex("48530401 00000000 0000000000000003") + "key");
+            client.async.send(Granted);
+            client.async.expect(hex("48530401 00000000 0000000000000000"));
+            client.async.send(Granted);
+            client.async.expect(hex("48530400 FFFFFEFE 0000000000000000"));
+            asked = true;
+            while (second == 0)
+                std::this_thread::yield();
+            test::awaitWaiting(second); // for its turn
+            client.async.send(ExclusiveReleased);
+            client.async.expect(hex("48531500 FFFFFEFE 0000000000000000")); // and no release before the last one
+            client.async.send(hex("48531600 00000000 0000000000000000"));
+            client.async.expect(hex("48530400 FFFFFEFE 0000000000000000"));
+            client.async.send(SharedReleased);
+        },
+        [&](VisaSession &session) {
+            EXPECT_EQ(viLock(session.vi, VI_SHARED_LOCK, 0, "key", nullptr), VI_SUCCESS);
+            EXPECT_EQ(viLock(session.vi, VI_SHARED_LOCK, 0, "key", nullptr), VI_SUCCESS_NESTED_SHARED);
+            EXPECT_EQ(lockExclusively(session, 0), VI_SUCCESS);
+            std::thread first([&] { EXPECT_EQ(viUnlock(session.vi), VI_SUCCESS_NESTED_SHARED); });
+            while (!asked)
+                std::this_thread::yield();
+            second = ::gettid();
+            EXPECT_EQ(viUnlock(session.vi), VI_SUCCESS_NESTED_SHARED);
+            first.join();
+            ViUInt16 status = 0;
+            EXPECT_EQ(viReadSTB(session.vi, &status), VI_SUCCESS);
+            EXPECT_EQ(viUnlock(session.vi), VI_SUCCESS);
+        });
 }
 
 // ---- Given up -------------------------------------------------------------------------------------------------------

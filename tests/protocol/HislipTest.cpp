@@ -61,6 +61,23 @@ TEST(Hislip, DescribesItself)
              });
 }
 
+TEST(Hislip, IsReachedByAnIpv6Address)
+{
+    ScriptedPeer peer(
+        [](ScriptedPeer &self) {
+            HislipConnections client = acceptHislip(self);
+            client.sync.expect(hex("48530700 FFFFFF00 0000000000000001") + "x");
+            client.sync.expectClosed();
+        },
+        true);
+    VisaSession session;
+    ASSERT_EQ(session.open("TCPIP::[::1]::hislip0," + std::to_string(peer.port()) + "::INSTR", 20000), VI_SUCCESS);
+    EXPECT_EQ(session.getText(VI_ATTR_TCPIP_ADDR), "::1");
+    EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_PORT), peer.port());
+    EXPECT_EQ(session.write("x"), VI_SUCCESS);
+    viClose(session.vi);
+}
+
 TEST(Hislip, CountsMessagesByTwoAndReportsDeliveryOnce)
 {
     converse(

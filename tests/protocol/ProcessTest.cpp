@@ -111,6 +111,32 @@ TEST(Process, ForkedChildThatOnlyClosesEnds)
     EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
 }
 
+std::size_t eventDescriptors()
+{
+    std::size_t count = 0;
+    for (const auto &entry : std::filesystem::directory_iterator("/proc/self/fd")) {
+        std::error_code gone;
+        count += std::filesystem::read_symlink(entry.path(), gone) == "anon_inode:[eventfd]" ? 1 : 0;
+    }
+    return count;
+}
+
+TEST(Process, ForkedChildThatClosesKeepsNoDescriptor)
+{
+    ScriptedPeer peer([](ScriptedPeer &self) {
+        HislipConnections client = acceptHislip(self);
+        client.sync.expectClosed();
+    });
+    const std::size_t before = eventDescriptors();
+    VisaSession session;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_QUEUE, 0), VI_SUCCESS);
+    EXPECT_GT(eventDescriptors(), before);
+    EXPECT_EQ(inFork([&] { return viClose(session.vi) == VI_SUCCESS ? static_cast<int>(eventDescriptors()) : 100; }),
+              static_cast<int>(before));
+    EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
+}
+
 TEST(Process, StartsNoThreadAndKeepsNoDescriptorForAResourceManager)
 {
     const std::size_t threads = entries("/proc/self/task");

@@ -1,6 +1,7 @@
 // Raw sockets: what the instrument says, and the exact bytes that the library must have sent.
 #include "support/ClosedPort.h"
 #include "support/Completion.h"
+#include "support/QuietFork.h"
 #include "support/ScriptedPeer.h"
 #include "support/Stopwatch.h"
 #include "support/VisaSession.h"
@@ -553,6 +554,47 @@ TEST(Socket, JobsThatWaitAreBounded)
     EXPECT_GE(taken, 1024);
     EXPECT_LE(taken, 1025); // the one that runs does not wait
     EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
+}
+
+TEST(Socket, LockThatWasTakenWhileACallWaitedForItsTurnKeepsItOut)
+{
+    std::atomic<bool> locked{false};
+    ScriptedPeer peer([&](ScriptedPeer &self) {
+        PeerConnection client = self.accept();
+        PeerConnection owner = self.accept();
+        while (!locked)
+            std::this_thread::yield();
+        client.send("x");
+        client.expectClosed(); // and nothing was written
+        owner.expectClosed();
+    });
+    VisaSession session;
+    VisaSession owner;
+    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(owner.open(resource(peer)), VI_SUCCESS);
+    session.set(VI_ATTR_TMO_VALUE, 30000);
+    std::array<std::atomic<pid_t>, 2> callers{};
+    std::thread reader([&] {
+        callers[0] = ::gettid();
+        ViByte byte = 0;
+        EXPECT_EQ(viRead(session.vi, &byte, 1, nullptr), VI_SUCCESS_MAX_CNT);
+    });
+    while (callers[0] == 0)
+        std::this_thread::yield();
+    test::awaitWaiting(callers[0]);
+    std::thread writer([&] {
+        callers[1] = ::gettid();
+        EXPECT_EQ(viWrite(session.vi, reinterpret_cast<ViConstBuf>("late"), 4, nullptr), VI_ERROR_RSRC_LOCKED);
+    });
+    while (callers[1] == 0)
+        std::this_thread::yield();
+    test::awaitWaiting(callers[1]);
+    ASSERT_EQ(viLock(owner.vi, VI_EXCLUSIVE_LOCK, 0, nullptr, nullptr), VI_SUCCESS);
+    locked = true;
+    reader.join();
+    writer.join();
+    viClose(session.vi);
+    viClose(owner.vi);
 }
 
 std::size_t openDescriptors()

@@ -32,6 +32,14 @@ inline bool threadWaits(const std::string &id)
     return (std::ifstream(folder + "/syscall") >> call) && std::find(Waits.begin(), Waits.end(), call) != Waits.end();
 }
 
+/// Waits until that thread waits, 20 s at most.
+inline void awaitWaiting(pid_t thread)
+{
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    while (!threadWaits(std::to_string(thread)) && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::yield();
+}
+
 /**
  * fork(), once every other thread of the process waits. A child that is born while another thread allocates memory finds the
  * sanitizers' allocator locked for ever: they do not take care of that as the C library does. Gives up waiting after 20 s and

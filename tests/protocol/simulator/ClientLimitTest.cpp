@@ -72,6 +72,20 @@ TEST_F(ClientLimit, SilentSocketsKeepNobodyOut)
     EXPECT_EQ(before.receiveLine(), "1\n") << "who has said something stays";
 }
 
+TEST_F(ClientLimit, SocketsThatHaveSaidAllAndDoNotReadKeepNobodyOut)
+{
+    const std::string size = "16000000"; // more than the system keeps for a client
+    ask("MMEM:DATA \"b\",#8" + size + std::string(16'000'000, 'b') + ";*OPC?\n");
+    std::vector<std::unique_ptr<RawClient>> clients;
+    for (int i = 0; i < 3; ++i) {
+        clients.push_back(std::make_unique<RawClient>(socket));
+        clients.back()->send("MMEM:DATA? \"b\"\n");
+        clients.back()->finishSending();
+        EXPECT_EQ(clients.back()->receive(2), "#8");
+    }
+    EXPECT_EQ(ask("*OPC?\n"), "1\n");
+}
+
 TEST_F(ClientLimit, SocketsThatSpeakAreNotGivenUpForNewOnes)
 {
     {

@@ -738,6 +738,8 @@ TEST(SerialPorts, RealOnesInAnOrderThatStays)
     std::filesystem::create_directories(root.file("dev/serial/by-id"));
     std::filesystem::create_symlink("../../ttyUSB0", root.file("dev/serial/by-id/usb-Zeta"));
     std::filesystem::create_symlink("../../ttyUSB1", root.file("dev/serial/by-id/usb-Alpha"));
+    for (const char *another : {"usb-Beta", "usb-Eta", "usb-Zulu"}) // the first name counts
+        std::filesystem::create_symlink("../../ttyUSB1", root.file(std::string("dev/serial/by-id/") + another));
     EXPECT_EQ(os::serialPorts(root.file("")),
               (std::vector<std::string>{"/dev/ttyACM0", "/dev/ttyS2", "/dev/ttyS10", "/dev/ttyUSB1", "/dev/ttyUSB0"}));
     EXPECT_TRUE(os::serialPorts(root.file("nowhere")).empty());

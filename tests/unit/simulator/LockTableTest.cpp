@@ -94,6 +94,27 @@ TEST_F(Locks, RefuseWhatIsHeldAlready)
     EXPECT_EQ(request(a, "other"), Answer::Error);
 }
 
+TEST_F(Locks, AreNotForANewcomerWhileSomebodyWaits)
+{
+    request(a, "");
+    auto &first = request(b, "", 1000ms);
+    table.release(a);
+    EXPECT_EQ(request(c, ""), Answer::Failed);
+    EXPECT_EQ(request(c, "key"), Answer::Failed);
+    timers.turn();
+    EXPECT_EQ(first, Answer::Granted);
+}
+
+TEST_F(Locks, AreForANewcomerWhoSharesWithThoseWhoWait)
+{
+    request(a, "");
+    auto &first = request(b, "key", 1000ms);
+    table.release(a);
+    EXPECT_EQ(request(c, "key"), Answer::Granted);
+    timers.turn();
+    EXPECT_EQ(first, Answer::Granted);
+}
+
 TEST_F(Locks, GoToTheNextInLineWhenReleased)
 {
     request(a, "");
