@@ -310,7 +310,9 @@ ViStatus HislipTransport::flushLine(ViUInt16 mask, const os::WaitLimit &limit)
     if (!m_sync.isOpen())
         return VI_ERROR_CONN_LOST;
     if ((mask & (VI_IO_IN_BUF | VI_IO_IN_BUF_DISCARD)) == 0)
-        return VI_SUCCESS; // what was sent is the system's
+        return VI_SUCCESS;                                               // what was sent is the system's
+    if (const ViStatus status = finishClear(limit); status < VI_SUCCESS) // its end is in that input too
+        return status;
     const os::WaitLimit atOnce{os::Deadline::now(), limit.wakeup};
     do {
         if (!m_inMessage) {

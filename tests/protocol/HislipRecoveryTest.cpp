@@ -83,6 +83,30 @@ TEST(HislipRecovery, WriteBehindAClearWhoseEndWasNotConfirmedWaitsForThat)
         });
 }
 
+TEST(HislipRecovery, FlushBehindAClearThatTimedOutDoesNotTakeItsEndAway)
+{
+    std::atomic<bool> timedOut{false};
+    converse(
+        [&](HislipConnections &client) {
+            client.async.expect(hex("48531300 00000000 0000000000000000"));
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+            client.sync.expect(hex("48530800 00000000 0000000000000000"));
+            while (!timedOut)
+                std::this_thread::yield();
+            client.sync.send(hex("48530600 FFFFFF00 0000000000000003") + "old" +
+                             hex("48530900 00000000 0000000000000000"));
+            client.sync.expect(hex("48530700 FFFFFF00 0000000000000001") + "x");
+        },
+        [&](VisaSession &session) {
+            session.set(VI_ATTR_TMO_VALUE, 50);
+            EXPECT_EQ(viClear(session.vi), VI_ERROR_TMO);
+            session.set(VI_ATTR_TMO_VALUE, 20000);
+            timedOut = true;
+            EXPECT_EQ(viFlush(session.vi, VI_IO_IN_BUF_DISCARD), VI_SUCCESS);
+            EXPECT_EQ(session.write("x"), VI_SUCCESS);
+        });
+}
+
 TEST(HislipRecovery, SecondClearGoesOnWithTheFirst)
 {
     std::atomic<bool> timedOut{false};
