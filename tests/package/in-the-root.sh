@@ -52,8 +52,9 @@ ldconfig -p >/tmp/linker && grep -q 'libkyvisa\.so ' /tmp/linker || fail "the li
 for program in KyVisaTester KyVisaSimulator; do
   if ldd /usr/bin/$program | grep 'not found'; then fail "$program lacks a library"; fi
 done
+# In another width than usual: what man has rendered in the usual one, it keeps.
 for page in KyVisaTester KyVisaSimulator libkyvisa kyvisa.ini; do
-  man "$page" >/tmp/page && grep -q "^NAME" /tmp/page || fail "no manual page of $page"
+  MANWIDTH=100 man "$page" >/tmp/page && grep -q "^NAME" /tmp/page || fail "no manual page of $page"
 done
 desktop-file-validate /usr/share/applications/example.oltrava.KyVisaTester.desktop
 
