@@ -11,6 +11,9 @@
 #include <gtest/gtest.h>
 #include <locale>
 #include <sstream>
+#ifdef __SANITIZE_ADDRESS__
+#include <sanitizer/lsan_interface.h>
+#endif
 
 using test::SimulatorProcess;
 using test::VisaSession;
@@ -24,7 +27,7 @@ protected:
     void SetUp() override
     {
         ::setenv("LOCPATH", LOCALES, 1);
-        std::locale::global(std::locale("de_DE.UTF-8")); // and with it that of C
+        becomeGerman();
         std::ostringstream number;
         number << 1234.5;
         ASSERT_EQ(number.str(), "1.234,5");
@@ -35,6 +38,14 @@ protected:
         std::locale::global(std::locale::classic());
         ::unsetenv("LOCPATH");
         ::unsetenv("KYVISA_CONFIG");
+    }
+
+    static void becomeGerman()
+    {
+#ifdef __SANITIZE_ADDRESS__
+        const __lsan::ScopedDisabler theCLibraryKeepsTheFolders;
+#endif
+        std::locale::global(std::locale("de_DE.UTF-8")); // and with it that of C
     }
 
     test::TemporaryFolder m_folder;
