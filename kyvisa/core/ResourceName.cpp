@@ -125,7 +125,7 @@ bool parseDeviceName(std::string_view text, ResourceName &name)
             return false;
     }
     name.deviceName = text;
-    return !text.empty() &&
+    return !text.empty() && text.back() != ':' &&
            std::none_of(text.begin(), text.end(), [](unsigned char c) { return c <= ' ' || c == 0x7F; });
 }
 
@@ -267,7 +267,8 @@ std::string ResourceName::canonical() const
 ViStatus parseResourceName(std::string_view text, ResourceName &name)
 {
     name = {};
-    if (text.size() > MaxResourceName)
+    const auto isControl = [](unsigned char c) { return c < ' ' || c == 0x7F; };
+    if (text.size() > MaxResourceName || std::any_of(text.begin(), text.end(), isControl))
         return VI_ERROR_INV_RSRC_NAME;
     const auto *known = std::find_if(Interfaces.begin(), Interfaces.end(), [&](const InterfaceName &candidate) {
         return startsIgnoringCase(text, candidate.prefix);
