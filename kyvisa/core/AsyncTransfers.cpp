@@ -155,14 +155,17 @@ void AsyncTransfers::abort(const Job &job)
     complete(job, VI_ERROR_ABORT, 0);
 }
 
+void AsyncTransfers::stop()
+{
+    const std::lock_guard lock(m_mutex);
+    m_closed = true;
+    m_waiting.clear();
+    m_changed.notify_all();
+}
+
 void AsyncTransfers::close()
 {
-    {
-        const std::lock_guard lock(m_mutex);
-        m_closed = true;
-        m_waiting.clear();
-        m_changed.notify_all();
-    }
+    stop();
     if (m_thread.joinable())
         m_thread.join();
 }

@@ -54,7 +54,9 @@ public:
     /// Ends one job with VI_ERROR_ABORT. @return VI_ERROR_INV_JOB_ID when it is over or was never here.
     ViStatus terminate(ViJobId id);
     void terminateAll();
-    /// Once the session's turn is closed: drops what waits, and returns when the thread has ended.
+    /// From here on nothing is taken, begun or posted.
+    void stop();
+    /// Once the session's turn is closed: stops, and returns when the thread has ended.
     void close();
 
     /// For the time in which a job has the session's turn.

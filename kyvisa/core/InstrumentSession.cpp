@@ -53,10 +53,7 @@ InstrumentSession::InstrumentSession(Library &library, const ResourceName &name,
           [this](const AsyncTransfers::Job &job, const std::atomic<bool> &cancelled, std::size_t &count) {
               return carryOut(job, cancelled, count);
           },
-          [this](const Event &event) {
-              if (!m_interruptions.closing.load())
-                  m_events->post(event);
-          })
+          [this](const Event &event) { m_events->post(event); })
 {
     describeResource(name, m_attributes);
     m_attributes.setNumber(VI_ATTR_RM_SESSION, resourceManager);
@@ -480,6 +477,7 @@ ViStatus InstrumentSession::setAttribute(ViAttr attribute, ViAttrState state)
 
 ViStatus InstrumentSession::close()
 {
+    m_jobs.stop();
     m_interruptions.closing.store(true);
     m_wakeup.close();
     m_gate.close();
