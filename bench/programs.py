@@ -8,12 +8,13 @@ import argparse
 import json
 import os
 import pathlib
+import select
 import statistics
 import subprocess
 import tempfile
 import time
 
-LONGEST = 60  # seconds until a window is painted
+LONGEST = 30  # seconds until a window is painted
 IDLE = 2  # seconds; what the start leaves to do is done by then
 
 parser = argparse.ArgumentParser()
@@ -33,9 +34,10 @@ def started(program):
     process = subprocess.Popen([program], env={**environment, "FIRST_PAINT_FD": str(writing)}, pass_fds=[writing])
     os.close(writing)
     with os.fdopen(reading) as pipe:
-        painted = pipe.readline()
+        painted = pipe.readline() if select.select([pipe], [], [], LONGEST)[0] else ""
     if not painted:
-        raise RuntimeError(f"{program} painted no window")
+        ended(process)
+        raise RuntimeError(f"{program} painted no window within {LONGEST} s")
     return process, int(painted) - begin
 
 
