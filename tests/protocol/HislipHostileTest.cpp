@@ -229,9 +229,13 @@ TEST(HislipHostile, InstrumentThatDoesNotReadStopsTheWriteAndAClearRecovers)
         client.sync.expect(hex("48530700 FFFFFF00 0000000003D09000"));
         while (stuck)
             std::this_thread::yield();
-        client.sync.take(Size); // the message is finished before the clear
-        client.async.expect(hex("48531300 00000000 0000000000000000"));
-        client.async.send(hex("48531700 00000000 0000000000000000"));
+        // On a busy machine the clear may be asked for while the message is still being finished.
+        std::thread asynchronous([&] {
+            client.async.expect(hex("48531300 00000000 0000000000000000"));
+            client.async.send(hex("48531700 00000000 0000000000000000"));
+        });
+        client.sync.take(Size);
+        asynchronous.join();
         client.sync.expect(hex("48530800 00000000 0000000000000000"));
         client.sync.send(hex("48530900 00000000 0000000000000000"));
         client.sync.expect(hex("48530700 FFFFFF00 0000000000000001") + "x");
