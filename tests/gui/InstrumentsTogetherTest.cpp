@@ -65,12 +65,12 @@ TEST_F(Together, TwoInstrumentsAreTestedWhileTheSessionIsUsed)
     expectNoFinding();
 }
 
-/// Two tests that can share an instrument: its status registers are one, so at most one of them may wait for service requests.
+/// Two ways to one instrument. Its status registers and its file are one, so only some tests can share it: the IEEE 488.2 stress
+/// test on one way, and on the other, which has no service requests, the performance test.
 struct Pair {
     const Way &first;
-    int firstTest;
     const Way &second;
-    int secondTest;
+    int stressed; ///< slot of the stress test
 };
 
 void PrintTo(const Pair &pair, std::ostream *out)
@@ -84,31 +84,33 @@ class OneInstrument : public Together, public ::testing::WithParamInterface<Pair
 
 TEST_P(OneInstrument, IsTestedOverTwoWaysWhileTheSessionIsUsed)
 {
-    const auto &[first, firstTest, second, secondTest] = GetParam();
+    const auto &[first, second, stressed] = GetParam();
+    const int measured = 1 - stressed;
     const Simulator instrument = simulator(second, first.options);
     openPage(resourceOf(instrument, first.service));
     connectSession();
     enter("test1Resource", resourceOf(instrument, second.service));
-    choose(0, static_cast<Test>(firstTest));
-    choose(1, static_cast<Test>(secondTest));
-    startSurely(0);
-    startSurely(1);
-    ASSERT_TRUE(logged(StressRuns, 2)) << endOfLog();
-    useTheSession(20);
-    EXPECT_TRUE(logged(":MMEM:DATA? 'Test.dat'", 2)) << endOfLog();
-    EXPECT_TRUE(logged("err?;error?", 2)) << endOfLog();
-    EXPECT_TRUE(isRunning(0)) << endOfLog();
-    EXPECT_TRUE(isRunning(1)) << endOfLog();
-    stopBoth();
+    choose(stressed, Stress4882);
+    choose(measured, Performance);
+    startSurely(stressed);
+    ASSERT_TRUE(logged(StressRuns)) << endOfLog();
+    for (int i = 1; i <= 3; ++i) {
+        startSurely(measured);
+        useTheSession(5);
+        ASSERT_TRUE(ends(measured, 60000)) << endOfLog();
+        ASSERT_TRUE(logged("Test finished without Errors", i)) << endOfLog();
+    }
+    EXPECT_TRUE(isRunning(stressed)) << endOfLog();
+    stop(stressed);
+    EXPECT_TRUE(ends(stressed, 60000)) << endOfLog();
     expectNoFinding();
 }
 
 INSTANTIATE_TEST_SUITE_P(Over, OneInstrument,
-                         ::testing::Values(Pair{ways::Hislip, 2, ways::RawSocket, 1},
-                                           Pair{ways::Hislip, 2, ways::Serial, 1},
-                                           Pair{ways::RawSocket, 1, ways::Hislip, 2},
-                                           Pair{ways::RawSocket, 1, ways::Vxi11, 2},
-                                           Pair{ways::RawSocket, 1, ways::Gateway, 2}),
+                         ::testing::Values(Pair{ways::Hislip, ways::RawSocket, 0}, Pair{ways::Hislip, ways::Serial, 0},
+                                           Pair{ways::RawSocket, ways::Hislip, 1},
+                                           Pair{ways::RawSocket, ways::Vxi11, 1},
+                                           Pair{ways::RawSocket, ways::Gateway, 1}),
                          [](const auto &each) { return testing::PrintToString(each.param); });
 
 TEST_F(Together, AStormOfStartsAndStopsLeavesEveryButtonAlive)
