@@ -40,11 +40,12 @@ protected:
     }
 
     /// Runs what is drawn and then, as the last action, a device clear during which the test is stopped.
-    unsigned act(std::vector<Draw> draws)
+    /// @param clears so many of them in all, with the one of the set-up and the last one
+    unsigned act(std::vector<Draw> draws, int clears = 2)
     {
         draws.push_back(action(0));
         draw(draws);
-        friendly("viClear", 1);
+        friendly("viClear", clears - 1);
         stopDuring("viClear");
         return run(stressMmemTest);
     }
@@ -322,6 +323,32 @@ TEST_F(StressMmem, OnASerialLineTheEndModeIsOffForTheData)
                             "set 3FFF00B3=0", "read 1", "set 3FFF00B3=2", "read 4096"));
 }
 
+TEST_F(StressMmem, DoesNotReadBackABlockThatAClearMayHaveDiscarded)
+{
+    EXPECT_EQ(act({action(6), Odd, BlockOfOneByte, AnyDraw, AnyDraw, action(0), action(8)}, 3), 0u);
+    EXPECT_THAT(actionAsked(), ElementsAre(HasSubstr("write :MMEM:DATA 'Test.dat',#11"), "viClear"));
+    EXPECT_THAT(actionLines(), ElementsAre(Aborted));
+}
+
+TEST_F(StressMmem, ReadsABlockBackAfterAClearWhenAnAnswerHasShownThatItWasTaken)
+{
+    readsBack("#11\xFF\n"); // never what was written
+    draw({action(6), Odd, BlockOfOneByte, AnyDraw, AnyDraw, action(3), action(0), action(8), Even, Even});
+    EXPECT_EQ(run(stressMmemTest), 1u);
+    EXPECT_THAT(asked(), Contains("write :MMEM:DATA? 'Test.dat'\n"));
+    EXPECT_EQ(standin::calls("viClear").size(), 2u);
+}
+
+TEST_F(StressMmem, OnARawSocketAClearDiscardsNoBlock)
+{
+    beRawSocket();
+    readsBack("#11\xFF\n");
+    draw({action(6), Odd, BlockOfOneByte, AnyDraw, action(0), action(8)});
+    EXPECT_EQ(run(stressMmemTest), 1u);
+    EXPECT_THAT(asked(), Contains("write :MMEM:DATA? 'Test.dat'\n"));
+    EXPECT_EQ(standin::calls("viClear").size(), 2u);
+}
+
 TEST_F(StressMmem, OnASerialLineAClearWaitsUntilTheBlockHasLeft)
 {
     beSerial();
@@ -346,7 +373,7 @@ TEST_F(StressMmem, OnASerialLineAClearWaitsUntilTheBlockHasLeft)
 TEST_F(StressMmem, OnARawSocketTheDataIsReadUntilComplete)
 {
     beRawSocket();
-    draw({action(6), Odd, {10, 1}, {100, 'A'}, {100, '\n'}, action(8)});
+    draw({action(6), Odd, {10, 1}, {100, 'A'}, {100, '\n'}, action(8)}, 29583474);
     friendly("viRead", 5);
     for (const char *piece : {"#1", "2", "A", "\n"})
         answer(piece);
