@@ -1,5 +1,6 @@
 #include "kyvisa/core/HandleTable.h"
 
+#include <algorithm>
 #include <mutex>
 
 namespace kyvisa
@@ -20,9 +21,10 @@ ViObject HandleTable::insert(ObjectPointer object, ViObject parent)
     if (parent != 0 && !slotOf(parent))
         return 0;
     std::size_t index;
-    if (m_free.size() > RestingSlots || (m_slots.size() == MaxSlots && !m_free.empty())) {
-        index = m_free.front();
-        m_free.pop_front();
+    if (m_freeCount > RestingSlots || (m_slots.size() == MaxSlots && m_freeCount > 0)) {
+        index = m_firstFree;
+        m_firstFree = m_slots[index].nextFree;
+        --m_freeCount;
     } else if (m_slots.size() < MaxSlots) {
         index = m_slots.size();
         m_slots.emplace_back();
@@ -42,10 +44,11 @@ ObjectPointer HandleTable::find(ViObject handle) const
     return slot ? slot->object : nullptr;
 }
 
-ObjectPointer HandleTable::release(std::size_t index)
+ObjectPointer HandleTable::release(std::size_t index) noexcept
 {
     Slot &slot = m_slots[index];
-    m_free.push_back(static_cast<std::uint16_t>(index));
+    (m_freeCount++ == 0 ? m_firstFree : m_slots[m_lastFree].nextFree) = static_cast<std::uint16_t>(index);
+    m_lastFree = static_cast<std::uint16_t>(index);
     if (++slot.generation == 0)
         slot.generation = 1;
     slot.parent = 0;
@@ -61,9 +64,12 @@ ObjectPointer HandleTable::remove(ViObject handle)
 std::vector<ObjectPointer> HandleTable::removeChildren(ViObject parent)
 {
     const std::unique_lock lock(m_mutex);
+    const auto isChild = [parent](const Slot &slot) { return slot.object && slot.parent == parent; };
     std::vector<ObjectPointer> children;
+    // Either there is room for all of them, or none is taken out.
+    children.reserve(static_cast<std::size_t>(std::count_if(m_slots.begin(), m_slots.end(), isChild)));
     for (std::size_t i = 0; i < m_slots.size(); ++i)
-        if (m_slots[i].object && m_slots[i].parent == parent)
+        if (isChild(m_slots[i]))
             children.push_back(release(i));
     return children;
 }

@@ -3,7 +3,6 @@
 #include "kyvisa/core/Object.h"
 
 #include <cstdint>
-#include <deque>
 #include <shared_mutex>
 #include <vector>
 
@@ -48,14 +47,18 @@ private:
         ObjectPointer object;
         ViObject parent = 0;
         std::uint16_t generation = 1;
+        std::uint16_t nextFree = 0; ///< of a free slot that is not the last one
     };
 
     const Slot *slotOf(ViObject handle) const;
-    ObjectPointer release(std::size_t index);
+    ObjectPointer release(std::size_t index) noexcept;
 
     mutable std::shared_mutex m_mutex;
     std::vector<Slot> m_slots;
-    std::deque<std::uint16_t> m_free;
+    // Free slots stand in line by their own numbers: closing needs no memory.
+    std::size_t m_freeCount = 0;
+    std::uint16_t m_firstFree = 0;
+    std::uint16_t m_lastFree = 0;
 };
 
 } // namespace kyvisa

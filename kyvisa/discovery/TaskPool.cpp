@@ -2,7 +2,7 @@
 
 #include "kyvisa/os/Thread.h"
 
-#include <system_error>
+#include <exception>
 #include <utility>
 
 namespace kyvisa
@@ -20,8 +20,9 @@ void TaskPool::add(std::function<void()> task)
     if (enough)
         return;
     try {
+        m_threads.reserve(m_threads.size() + 1); // a thread that runs must have its place
         m_threads.push_back(os::startThread([this] { work(); }));
-    } catch (const std::system_error &) {
+    } catch (const std::exception &) { // neither a thread nor memory for one
         if (!m_threads.empty())
             return;
         std::function<void()> own = std::move(m_tasks.back());

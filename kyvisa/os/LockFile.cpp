@@ -47,13 +47,16 @@ std::string LockFile::standardPath()
 int LockFile::openFile() const
 {
     // Not in one step: in a folder for everybody the system refuses to "create" what another user has made already.
-    int descriptor = systemCalls().open(m_path.c_str(), Flags, 0);
+    const auto open = [this](int flags, mode_t mode) {
+        return untilNotInterrupted([&] { return systemCalls().open(m_path.c_str(), flags, mode); });
+    };
+    int descriptor = open(Flags, 0);
     if (descriptor < 0 && errno == ENOENT) {
-        descriptor = systemCalls().open(m_path.c_str(), Flags | O_CREAT | O_EXCL, ForEverybody);
+        descriptor = open(Flags | O_CREAT | O_EXCL, ForEverybody);
         if (descriptor >= 0)
             ::fchmod(descriptor, ForEverybody); // whatever the process masks out
         else if (errno == EEXIST)
-            descriptor = systemCalls().open(m_path.c_str(), Flags, 0);
+            descriptor = open(Flags, 0);
     }
     struct stat status {
     };
@@ -78,9 +81,9 @@ bool LockFile::ready()
 LockFile::Outcome LockFile::tryLock(Range range, Kind kind) const
 {
     struct flock lock = rangeOf(range, kind == Kind::Exclusive ? F_WRLCK : F_RDLCK);
-    if (systemCalls().lockFile(m_descriptor, F_OFD_SETLK, &lock) == 0)
+    if (untilNotInterrupted([&] { return systemCalls().lockFile(m_descriptor, F_OFD_SETLK, &lock); }) == 0)
         return Outcome::Done;
-    return errno == EAGAIN || errno == EACCES || errno == EINTR ? Outcome::Held : Outcome::Unavailable;
+    return errno == EAGAIN || errno == EACCES ? Outcome::Held : Outcome::Unavailable;
 }
 
 LockFile::Outcome LockFile::lockBriefly(Range range) const
@@ -96,13 +99,14 @@ LockFile::Outcome LockFile::lockBriefly(Range range) const
 void LockFile::unlock(Range range) const
 {
     struct flock lock = rangeOf(range, F_UNLCK);
-    systemCalls().lockFile(m_descriptor, F_OFD_SETLK, &lock);
+    untilNotInterrupted([&] { return systemCalls().lockFile(m_descriptor, F_OFD_SETLK, &lock); });
 }
 
 std::optional<LockFile::Found> LockFile::find(Range range) const
 {
     struct flock lock = rangeOf(range, F_WRLCK);
-    if (systemCalls().lockFile(m_descriptor, F_OFD_GETLK, &lock) != 0 || lock.l_type == F_UNLCK)
+    if (untilNotInterrupted([&] { return systemCalls().lockFile(m_descriptor, F_OFD_GETLK, &lock); }) != 0 ||
+        lock.l_type == F_UNLCK)
         return std::nullopt;
     return Found{lock.l_type == F_WRLCK ? Kind::Exclusive : Kind::Shared, lock.l_start};
 }

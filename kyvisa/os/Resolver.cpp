@@ -8,10 +8,10 @@
 #include <array>
 #include <atomic>
 #include <cstring>
+#include <exception>
 #include <memory>
 #include <netinet/in.h>
 #include <strings.h>
-#include <system_error>
 
 namespace kyvisa::os
 {
@@ -41,6 +41,7 @@ std::vector<Address> lookUp(const SystemCalls &calls, const std::string &host, c
     std::vector<Address> addresses;
     if (calls.getaddrinfo(host.c_str(), service.c_str(), &hints, &found) != 0)
         return addresses;
+    const std::unique_ptr<addrinfo, decltype(&::freeaddrinfo)> owned(found, &::freeaddrinfo);
     for (const addrinfo *entry = found; entry != nullptr; entry = entry->ai_next) {
         Address address;
         if (entry->ai_addrlen > sizeof address.storage)
@@ -49,7 +50,6 @@ std::vector<Address> lookUp(const SystemCalls &calls, const std::string &host, c
         address.length = entry->ai_addrlen;
         addresses.push_back(address);
     }
-    ::freeaddrinfo(found);
     return addresses;
 }
 
@@ -91,21 +91,19 @@ void answer(const std::shared_ptr<Question> &question)
 IoResult askOnThread(const std::string &host, const std::string &service, const WaitLimit &limit,
                      std::vector<Address> &addresses)
 {
-    if (g_openQuestions.fetch_add(1) >= MaxOpenQuestions) {
-        g_openQuestions.fetch_sub(1);
-        return IoResult::NoMemory;
-    }
     const auto question = std::make_shared<Question>();
     question->host = host;
     question->service = service;
     question->calls = &systemCalls();
-    if (!question->done.valid()) {
+    if (!question->done.valid())
+        return IoResult::NoMemory;
+    if (g_openQuestions.fetch_add(1) >= MaxOpenQuestions) {
         g_openQuestions.fetch_sub(1);
         return IoResult::NoMemory;
     }
     try {
         startThread([question] { answer(question); }).detach();
-    } catch (const std::system_error &) {
+    } catch (const std::exception &) { // neither a thread nor memory for one
         g_openQuestions.fetch_sub(1);
         return IoResult::NoMemory;
     }

@@ -133,12 +133,13 @@ SerialPort::SerialPort(SerialPort &&other) noexcept
 
 bool SerialPort::control(unsigned long request, void *argument) const
 {
-    return systemCalls().ioctl(m_descriptor, request, argument) == 0;
+    return untilNotInterrupted([&] { return systemCalls().ioctl(m_descriptor, request, argument); }) == 0;
 }
 
 SerialPort::Opened SerialPort::open(const std::string &path)
 {
-    m_descriptor = systemCalls().open(path.c_str(), O_RDWR | O_NOCTTY | O_NONBLOCK | O_CLOEXEC, 0);
+    m_descriptor = untilNotInterrupted(
+        [&] { return systemCalls().open(path.c_str(), O_RDWR | O_NOCTTY | O_NONBLOCK | O_CLOEXEC, 0); });
     if (m_descriptor < 0) {
         if (errno == EBUSY)
             return Opened::Busy;
@@ -150,7 +151,7 @@ SerialPort::Opened SerialPort::open(const std::string &path)
         return Opened::Absent; // a file, but no port
     }
     // Both: the first keeps out whoever does not ask, the second those to whom the first does not apply (root).
-    if (systemCalls().flock(m_descriptor, LOCK_EX | LOCK_NB) != 0) {
+    if (untilNotInterrupted([&] { return systemCalls().flock(m_descriptor, LOCK_EX | LOCK_NB); }) != 0) {
         abandon();
         return Opened::Busy;
     }

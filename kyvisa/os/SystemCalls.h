@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cerrno>
 #include <fcntl.h>
 #include <ifaddrs.h>
 #include <netdb.h>
@@ -38,6 +39,16 @@ struct SystemCalls {
     int (*getifaddrs)(ifaddrs **result);
     int (*getaddrinfo)(const char *node, const char *service, const addrinfo *hints, addrinfo **result);
 };
+
+/// Makes a call that does not wait again for as long as signals interrupt it.
+template <typename Call>
+auto untilNotInterrupted(const Call &call)
+{
+    auto result = call();
+    while (result < 0 && errno == EINTR)
+        result = call();
+    return result;
+}
 
 /// What the library calls through.
 const SystemCalls &systemCalls();

@@ -440,7 +440,9 @@ bool HislipAsyncChannel::startReading()
     if (!m_stop.valid() || !m_news.valid())
         return false;
     try {
-        m_thread = std::make_unique<std::thread>(os::startThread([this] { readForEver(); }));
+        auto thread = std::make_unique<std::thread>(); // before it runs: without room for it there is none to end
+        *thread = os::startThread([this] { readForEver(); });
+        m_thread = std::move(thread);
     } catch (const std::system_error &) {
         return false;
     }

@@ -50,7 +50,9 @@ bool Vxi11Interrupt::start(std::uint32_t address)
     if (!m_stop.valid() || !m_listener.open(address))
         return false;
     try {
-        m_thread = std::make_unique<std::thread>(os::startThread([this] { serve(); }));
+        auto thread = std::make_unique<std::thread>(); // before it runs: without room for it there is none to end
+        *thread = os::startThread([this] { serve(); });
+        m_thread = std::move(thread);
     } catch (const std::system_error &) {
         return false;
     }

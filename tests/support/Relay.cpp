@@ -100,15 +100,14 @@ void Relay::pass(int from, int to, bool toClient)
         if (got <= 0)
             break;
         auto size = static_cast<std::size_t>(got);
-        if (toClient) {
-            const std::size_t before = m_passed.fetch_add(size);
-            if (before + size > m_manners.cutAfter) {
-                sendAll(to, buffer.data(), m_manners.cutAfter > before ? m_manners.cutAfter - before : 0);
-                const std::lock_guard lock(m_mutex);
-                for (const int descriptor : m_descriptors)
-                    ::shutdown(descriptor, SHUT_RDWR);
-                return;
-            }
+        const std::size_t cut = toClient ? m_manners.cutAfter : m_manners.cutAfterSent;
+        const std::size_t before = (toClient ? m_passed : m_sent).fetch_add(size);
+        if (before + size > cut) {
+            sendAll(to, buffer.data(), cut > before ? cut - before : 0);
+            const std::lock_guard lock(m_mutex);
+            for (const int descriptor : m_descriptors)
+                ::shutdown(descriptor, SHUT_RDWR);
+            return;
         }
         sendAll(to, buffer.data(), size);
     }

@@ -19,9 +19,10 @@ class Relay
 {
 public:
     struct Manners {
-        std::size_t piece = 64 * 1024;      ///< most bytes that are passed on at once
-        std::chrono::microseconds delay{0}; ///< before each piece; what comes meanwhile is merged with it
-        std::size_t cutAfter = SIZE_MAX;    ///< bytes to the client after which all connections end
+        std::size_t piece = 64 * 1024;       ///< most bytes that are passed on at once
+        std::chrono::microseconds delay{0};  ///< before each piece; what comes meanwhile is merged with it
+        std::size_t cutAfter = SIZE_MAX;     ///< bytes to the client after which all connections end
+        std::size_t cutAfterSent = SIZE_MAX; ///< the same for bytes to the server
     };
 
     Relay(std::uint16_t serverPort, Manners manners);
@@ -40,7 +41,8 @@ private:
     const Manners m_manners;
     int m_listener;
     std::uint16_t m_port = 0;
-    std::atomic<std::size_t> m_passed{0};
+    std::atomic<std::size_t> m_passed{0}; ///< to the client
+    std::atomic<std::size_t> m_sent{0};   ///< to the server
     std::mutex m_mutex;
     std::vector<int> m_descriptors;
     std::vector<std::thread> m_threads;
