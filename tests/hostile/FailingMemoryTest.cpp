@@ -110,10 +110,11 @@ protected:
 
     /// Runs @p call with its first allocation failing, then its second, until it gets all it asks for.
     /// @p before and @p after set the stage each time; what @p call answers with all its memory must be a success.
-    static void failEach(const char *what, const std::function<void()> &before, const std::function<ViStatus()> &call,
-                         const std::function<void(ViStatus)> &after)
+    void failEach(const char *what, const std::function<void()> &before, const std::function<ViStatus()> &call,
+                  const std::function<void(ViStatus)> &after)
     {
         for (int allowed = 0; allowed < MostAllocations; ++allowed) {
+            m_instrument.awaitSerialLine();
             before();
             s_failed = false;
             s_left = allowed;

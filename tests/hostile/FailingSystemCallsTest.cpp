@@ -192,6 +192,7 @@ protected:
             SCOPED_TRACE(std::string(row.name) + " fails with " + std::to_string(error) + " at time " +
                          std::to_string(nth));
             m_clears = !isSerial() || std::string_view(row.name) == "ioctl";
+            m_instrument.awaitSerialLine();
             g_plan.struck = false;
             g_plan.error = error;
             g_plan.afterwards = row.afterwards;
@@ -212,8 +213,11 @@ protected:
             if (!g_plan.struck)
                 return;
             m_clears = !isSerial();
-            if (isSerial())
+            if (isSerial()) {
+                m_instrument.awaitSerialLine();
                 settleLine();
+                m_instrument.awaitSerialLine();
+            }
             EXPECT_GE(converse(), VI_SUCCESS) << "the next session: " << m_last;
             if (HasFailure())
                 return;

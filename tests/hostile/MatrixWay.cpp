@@ -267,6 +267,7 @@ void MatrixWay::perform(TesterSession &session, const std::string &operation, un
 ViStatus MatrixWay::run(const std::string &fault, const std::string &operation, bool expectsTimeout,
                         std::string &troubles)
 {
+    awaitSerialLine();
     const std::size_t descriptors = entries("/proc/self/fd");
     const std::size_t threads = entries("/proc/self/task");
     ViStatus status = VI_SUCCESS;
@@ -298,8 +299,17 @@ ViStatus MatrixWay::run(const std::string &fault, const std::string &operation, 
     return status;
 }
 
+/// The instrument makes its serial line raw again once it has seen that it was closed, also under whoever has opened it meanwhile. What
+/// it answers to the second question it answers after that.
+void MatrixWay::awaitSerialLine()
+{
+    for (int i = 0; i < 2 && m_way == "serial"; ++i)
+        ask("*OPC?");
+}
+
 void MatrixWay::recover(const std::string &operation, std::string &troubles)
 {
+    awaitSerialLine();
     if (ask("*CLS;*SRE 0;*ESE 0;*OPC?") != "1\n")
         troubles += "the instrument is not as before; ";
     const ViStatus status = TesterSession::statusOf([&] {

@@ -36,6 +36,7 @@ private:
     void start();
     void prepare(TesterSession &session, const std::string &operation);
     void perform(TesterSession &session, const std::string &operation, unsigned timeout);
+    void awaitSerialLine();
     void recover(const std::string &operation, std::string &troubles);
     bool isRpc() const { return m_way == "vxi11" || m_way == "gpib"; }
     bool hasHeaders() const { return m_way != "socket" && m_way != "serial"; }
