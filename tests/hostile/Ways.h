@@ -61,6 +61,7 @@ public:
         EXPECT_EQ(viOpen(m_manager, m_simulator.resource("socket").c_str(), VI_NULL, 30000, &m_other), VI_SUCCESS);
         viSetAttribute(m_other, VI_ATTR_TMO_VALUE, 30000);
         viSetAttribute(m_other, VI_ATTR_TERMCHAR_EN, VI_TRUE);
+        awaitSerialLine(); // so that what the library opens once is open
     }
     ~Instrument() { viClose(m_manager); }
     Instrument(const Instrument &) = delete;
