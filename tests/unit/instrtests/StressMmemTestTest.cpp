@@ -5,6 +5,7 @@
 #include <QElapsedTimer>
 
 #include <algorithm>
+#include <chrono>
 
 using testing::Contains;
 using testing::ElementsAre;
@@ -596,17 +597,20 @@ TEST_F(StressMmem, TheAveragesAreMillionsOfBitsOfDataASecond)
     standin::script("viWrite", {.delay = std::chrono::milliseconds(100)});
     friendly("viRead", 7);
     standin::script("viRead", {.delay = std::chrono::milliseconds(200)});
+    const auto begin = std::chrono::steady_clock::now();
     EXPECT_EQ(act(blockOf('A')), 0u);
+    const std::chrono::duration<double> whole = std::chrono::steady_clock::now() - begin;
     double read = 0;
     double write = 0;
     ASSERT_EQ(std::sscanf(actionLines().back().c_str(),
                           "Ready with 1 Clear and 0 Trigger. Average read %lf MBits/s. Average write %lf MBits/s",
                           &read, &write),
               2);
-    // Of one byte: 8 bits in a tenth and a fifth of a second, or somewhat longer. The lines have six digits.
-    EXPECT_GT(write, 8e-6);
+    // One byte: 8 bits in a tenth and a fifth of a second at least, and in no longer than all of it took. The lines have six digits.
+    const double slowest = 8e-6 / whole.count() - 1e-6;
+    EXPECT_GE(write, slowest);
     EXPECT_LE(write, 81e-6);
-    EXPECT_GT(read, 4e-6);
+    EXPECT_GE(read, slowest);
     EXPECT_LE(read, 41e-6);
 }
 
