@@ -16,7 +16,7 @@ sys.dont_write_bytecode = True
 import figures
 import report
 
-PARTS = ("transport", "strangers", "log", "window", "start", "growth")
+PARTS = ("transport", "strangers", "log", "tests", "window", "start", "growth")
 LONGEST = 300  # seconds that one program may take
 
 parser = argparse.ArgumentParser()
@@ -87,6 +87,16 @@ def log():
     above("logged call above the bare call, logging off", "loggedCall/off", limit, f"<= {limit:.0f} (two clock readings + 20)", "twoClockReadings")
     rows.at_least("one line into both sinks, against spdlog asynchronous", series, "oneLine", "spdlogLine", 1.0, strictly=True)
     rows.at_most("allocations a line", values["allocationsOfALine"], 0, "")
+
+
+def tests():
+    series, _ = measure("bench-figures", "--rounds", quick(5, 25))
+    for direction in ("write", "read"):
+        for kind, name in (("socket", "raw socket"), ("hislip", "HiSLIP"), ("vxi11", "VXI-11")):
+            ours, rival = (f"{direction}/{kind}/{side}" for side in ("test", "bare"))
+            off = 100 * abs(1 - figures.rate_ratio(series[ours], series[rival]))
+            rows.at_most(f"performance test: block {direction}, {name}, off from a bare program", off, 10, "%", figures.summary(series[ours]),
+                         figures.summary(series[rival]))
 
 
 def window():
