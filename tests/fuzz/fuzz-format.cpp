@@ -61,7 +61,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     std::array<int, 4> integers{};
     promise(scan(text, "%lld,%lf,%,#d", &integer, &real, &count, integers.data()) == VI_SUCCESS);
     promise(count >= 0 && count <= 4);
-    for (const char *conversion : {"%8s", "%8t", "%8T", "%8[^,]", "%8c"})
+    for (const char *conversion : {"%8s", "%8t", "%8T", "%7[^,]", "%8c"})
         promise(scan(text, conversion, into.characters.data()) == VI_SUCCESS);
     promise(scan(text, "%#lb", &elements, into.characters.data()) == VI_SUCCESS);
     elements = 1;
