@@ -1,14 +1,13 @@
 // GPIB through a LAN/GPIB gateway: byte by byte against a scripted one, then against the simulator's bus.
 #include "support/SimulatorProcess.h"
+#include "support/TemporaryFolder.h"
 #include "support/Vxi11Instrument.h"
 
 #include <array>
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <functional>
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 using test::RpcServed;
 using test::ScriptedPeer;
@@ -26,20 +25,13 @@ class GatewayFile
 public:
     explicit GatewayFile(const std::string &lines)
     {
-        char name[] = "/tmp/kyvisa-gateways-XXXXXX";
-        const int descriptor = ::mkstemp(name);
-        EXPECT_GE(descriptor, 0);
-        ::close(descriptor);
-        m_name = name;
-        std::ofstream(m_name) << "[KYGPIB-GATEWAYS]\n" << lines;
-        ::setenv("KYVISA_CONFIG", m_name.c_str(), 1);
+        const std::string name = m_folder.file("kyvisa.ini");
+        std::ofstream(name) << "[KYGPIB-GATEWAYS]\n" << lines;
+        ::setenv("KYVISA_CONFIG", name.c_str(), 1);
     }
-    ~GatewayFile() { std::filesystem::remove(m_name); }
-    GatewayFile(const GatewayFile &) = delete;
-    GatewayFile &operator=(const GatewayFile &) = delete;
 
 private:
-    std::string m_name;
+    test::TemporaryFolder m_folder;
 };
 
 constexpr const char *Board0 = "Board0 = \"TCPIP::127.0.0.1::gpib0\"\n";

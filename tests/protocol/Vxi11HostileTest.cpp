@@ -23,9 +23,11 @@ namespace
 constexpr const char *NoAbort = "00000000 00000007 00000000 00100000";
 constexpr long Patience = 15000; // milliseconds
 
+const std::string TransactionId = "<id>"; // four bytes, as the real one
+
 struct Hostility {
     const char *name;
-    std::string answer; ///< instead of a reply; "XXXX" stands for the transaction id
+    std::string answer; ///< instead of a reply; `TransactionId` stands for the call's own
     ViStatus expected;
     std::string text; ///< what the read still delivers
 };
@@ -52,8 +54,8 @@ TEST_P(Vxi11Hostility, ReadEndsWithAStatusAndAnotherSessionGoesOn)
         [&](RpcServed &core, Vxi11Peer &) {
             core.takeCall();
             std::string answer = row.answer;
-            for (std::size_t at = answer.find("XXXX"); at != answer.npos; at = answer.find("XXXX"))
-                answer.replace(at, 4, core.xid);
+            for (std::size_t at = 0; (at = answer.find(TransactionId, at)) != answer.npos; at += core.xid.size())
+                answer.replace(at, TransactionId.size(), core.xid);
             core.connection.trySend(answer);
             while (!done)
                 std::this_thread::yield();
@@ -75,40 +77,48 @@ INSTANTIATE_TEST_SUITE_P(
         Hostility{"Nothing", "", VI_ERROR_TMO, ""}, Hostility{"HalfAMark", hex("8000"), VI_ERROR_TMO, ""},
         Hostility{"Text", "HTTP/1.1 400 Bad Request\r\nServer: nobody at home\r\n\r\n", VI_ERROR_CONN_LOST, ""},
         Hostility{"EmptyRecord", hex("80000000"), VI_ERROR_CONN_LOST, ""},
-        Hostility{"RecordShorterThanAHeader", hex("80000008") + "XXXX" + hex("00000001"), VI_ERROR_CONN_LOST, ""},
-        Hostility{"ResultsMissing", hex("80000018") + "XXXX" + Accepted, VI_ERROR_CONN_LOST, ""},
+        Hostility{"RecordShorterThanAHeader", hex("80000008") + TransactionId + hex("00000001"), VI_ERROR_CONN_LOST,
+                  ""},
+        Hostility{"ResultsMissing", hex("80000018") + TransactionId + Accepted, VI_ERROR_CONN_LOST, ""},
         Hostility{"DataShorterThanItsLength",
-                  hex("80000026") + "XXXX" + Accepted + hex("00000000 00000004 00000008") + "ab", VI_ERROR_CONN_LOST,
-                  "ab"},
+                  hex("80000026") + TransactionId + Accepted + hex("00000000 00000004 00000008") + "ab",
+                  VI_ERROR_CONN_LOST, "ab"},
         Hostility{"ACallInsteadOfAReply",
-                  hex("80000028") + "XXXX" + hex("00000000 00000002 000607AF 00000001 0000000C") +
+                  hex("80000028") + TransactionId + hex("00000000 00000002 000607AF 00000001 0000000C") +
                       std::string(16, '\0'),
                   VI_ERROR_CONN_LOST, ""},
         Hostility{"NeitherAcceptedNorDenied",
-                  hex("80000018") + "XXXX" + hex("00000001 00000002") + std::string(12, '\0'), VI_ERROR_CONN_LOST, ""},
-        Hostility{"LongVerifier", hex("80000400") + "XXXX" + hex("00000001 00000000 00000000 7FFFFFFF"),
+                  hex("80000018") + TransactionId + hex("00000001 00000002") + std::string(12, '\0'),
+                  VI_ERROR_CONN_LOST, ""},
+        Hostility{"LongVerifier", hex("80000400") + TransactionId + hex("00000001 00000000 00000000 7FFFFFFF"),
                   VI_ERROR_CONN_LOST, ""},
         Hostility{"MoreThanWasAskedFor",
-                  hex("80000038") + "XXXX" + Accepted + hex("00000000 00000004 00000011") + std::string(20, 'x'),
+                  hex("80000038") + TransactionId + Accepted + hex("00000000 00000004 00000011") + std::string(20, 'x'),
                   VI_ERROR_CONN_LOST, ""},
         Hostility{"LengthNear4GiB",
-                  hex("FFFFFFFF") + "XXXX" + Accepted + hex("00000000 00000004 FFFFFFFF") + std::string(100, 'x'),
+                  hex("FFFFFFFF") + TransactionId + Accepted + hex("00000000 00000004 FFFFFFFF") +
+                      std::string(100, 'x'),
                   VI_ERROR_CONN_LOST, ""},
         Hostility{"RecordOf2GiBThatNeverComes",
-                  hex("FFFFFFFF") + "XXXX" + Accepted + hex("00000000 00000004 00000003") + "abc", VI_SUCCESS, "abc"},
+                  hex("FFFFFFFF") + TransactionId + Accepted + hex("00000000 00000004 00000003") + "abc", VI_SUCCESS,
+                  "abc"},
         Hostility{"OtherTransaction", hex("80000028") + "none" + Accepted + hex("00000000 00000004 00000003") + "bad?",
                   VI_ERROR_TMO, ""},
         Hostility{"EmptyFragmentsWithoutEnd", std::string(4000, '\0'), VI_ERROR_CONN_LOST, ""},
-        Hostility{"AuthenticationAsked", hex("80000014") + "XXXX" + hex("00000001 00000001 00000001 00000001"),
+        Hostility{"AuthenticationAsked", hex("80000014") + TransactionId + hex("00000001 00000001 00000001 00000001"),
                   VI_ERROR_IO, ""},
-        Hostility{"OtherRpcVersion", hex("80000018") + "XXXX" + hex("00000001 00000001 00000000 00000003 00000003"),
-                  VI_ERROR_IO, ""},
-        Hostility{"NoSuchProgram", hex("80000018") + "XXXX" + hex("00000001 00000000 00000000 00000000 00000001"),
+        Hostility{"OtherRpcVersion",
+                  hex("80000018") + TransactionId + hex("00000001 00000001 00000000 00000003 00000003"), VI_ERROR_IO,
+                  ""},
+        Hostility{"NoSuchProgram",
+                  hex("80000018") + TransactionId + hex("00000001 00000000 00000000 00000000 00000001"),
                   VI_ERROR_NSUP_OPER, ""},
-        Hostility{"NoSuchProcedure", hex("80000018") + "XXXX" + hex("00000001 00000000 00000000 00000000 00000003"),
+        Hostility{"NoSuchProcedure",
+                  hex("80000018") + TransactionId + hex("00000001 00000000 00000000 00000000 00000003"),
                   VI_ERROR_NSUP_OPER, ""},
-        Hostility{"GarbageArguments", hex("80000018") + "XXXX" + hex("00000001 00000000 00000000 00000000 00000004"),
-                  VI_ERROR_IO, ""}),
+        Hostility{"GarbageArguments",
+                  hex("80000018") + TransactionId + hex("00000001 00000000 00000000 00000000 00000004"), VI_ERROR_IO,
+                  ""}),
     [](const auto &row) { return std::string(row.param.name); });
 
 } // namespace

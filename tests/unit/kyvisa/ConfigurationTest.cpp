@@ -1,4 +1,5 @@
 #include "kyvisa/core/Configuration.h"
+#include "support/TemporaryFolder.h"
 
 #include <cstdlib>
 #include <filesystem>
@@ -28,13 +29,10 @@ class ConfigurationFiles : public testing::Test
 protected:
     void SetUp() override
     {
-        char name[] = "/tmp/kyvisa-configuration-XXXXXX";
-        m_folder = ::mkdtemp(name);
         ::unsetenv("KYVISA_CONFIG");
         ::unsetenv("XDG_CONFIG_HOME");
         ::setenv("HOME", (m_folder / "home").c_str(), 1);
     }
-    void TearDown() override { std::filesystem::remove_all(m_folder); }
     void write(const std::filesystem::path &file, const std::string &text)
     {
         std::filesystem::create_directories((m_folder / file).parent_path());
@@ -42,7 +40,8 @@ protected:
     }
     static std::string board0() { return readConfiguration().gateways[0]; }
 
-    std::filesystem::path m_folder;
+    test::TemporaryFolder m_temporary;
+    const std::filesystem::path m_folder = m_temporary.file("");
 };
 
 } // namespace
