@@ -1,9 +1,8 @@
 // HiSLIP locks, seen from the client: what goes to the instrument, what is only counted, and what becomes of an answer that
 // comes too late. The bytes are those of the tables of IVI-6.1.
-#include "support/HislipPeer.h"
+#include "support/HislipConversation.h"
 #include "support/QuietFork.h"
 #include "support/Stopwatch.h"
-#include "support/VisaSession.h"
 
 #include <array>
 #include <atomic>
@@ -11,8 +10,10 @@
 #include <thread>
 
 using test::acceptHislip;
+using test::converse;
 using test::hex;
 using test::HislipConnections;
+using test::hislipResource;
 using test::ScriptedPeer;
 using test::Stopwatch;
 using test::VisaSession;
@@ -24,28 +25,6 @@ const std::string Granted = hex("48530501 00000000 0000000000000000");
 const std::string Failed = hex("48530500 00000000 0000000000000000");
 const std::string ExclusiveReleased = hex("48530501 00000000 0000000000000000");
 const std::string SharedReleased = hex("48530502 00000000 0000000000000000");
-
-std::string resource(const ScriptedPeer &peer)
-{
-    return "TCPIP::127.0.0.1::hislip0," + std::to_string(peer.port()) + "::INSTR";
-}
-
-/// Runs @p script as the instrument and @p user on an open session.
-template <typename Script, typename User>
-void converse(Script script, User user)
-{
-    ScriptedPeer peer([&](ScriptedPeer &self) {
-        HislipConnections client = acceptHislip(self);
-        script(client);
-        client.sync.expectClosed();
-        client.async.expectClosed();
-    });
-    VisaSession session;
-    ASSERT_EQ(session.open(resource(peer), 20000), VI_SUCCESS);
-    session.set(VI_ATTR_TMO_VALUE, 20000);
-    user(session);
-    EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
-}
 
 ViStatus lockExclusively(VisaSession &session, ViUInt32 timeout)
 {
@@ -167,7 +146,7 @@ TEST(HislipLocking, InstrumentThatRefusesAtOnceIsNotAskedInAnEndlessHurry)
         client.sync.expectClosed();
     });
     VisaSession session;
-    ASSERT_EQ(session.open(resource(peer), 20000), VI_SUCCESS);
+    ASSERT_EQ(session.open(hislipResource(peer), 20000), VI_SUCCESS);
     EXPECT_EQ(lockExclusively(session, 200), VI_ERROR_TMO);
     viClose(session.vi);
     EXPECT_LT(requests, 30);
@@ -247,7 +226,7 @@ TEST(HislipLocking, OpeningWithALockIsOpenThenLock)
         client.sync.expectClosed();
     });
     VisaSession session;
-    EXPECT_EQ(session.open(resource(peer), VI_TMO_IMMEDIATE, VI_EXCLUSIVE_LOCK), VI_ERROR_RSRC_LOCKED);
+    EXPECT_EQ(session.open(hislipResource(peer), VI_TMO_IMMEDIATE, VI_EXCLUSIVE_LOCK), VI_ERROR_RSRC_LOCKED);
     EXPECT_EQ(session.vi, VI_NULL);
 }
 
@@ -263,7 +242,7 @@ TEST(HislipLocking, WaitWhileOpeningEndsWithTheTimeOutOfTheWholeCall)
     });
     VisaSession session;
     const Stopwatch watch;
-    EXPECT_EQ(session.open(resource(peer), 700, VI_EXCLUSIVE_LOCK), VI_ERROR_RSRC_LOCKED);
+    EXPECT_EQ(session.open(hislipResource(peer), 700, VI_EXCLUSIVE_LOCK), VI_ERROR_RSRC_LOCKED);
     EXPECT_GE(watch.milliseconds(), 700);
     EXPECT_LT(watch.milliseconds(), 10000);
 }
@@ -402,7 +381,7 @@ TEST(HislipLocking, CloseEndsAWaitForALockWithoutEnd)
         client.sync.expectClosed();
     });
     VisaSession session;
-    ASSERT_EQ(session.open(resource(peer), 20000), VI_SUCCESS);
+    ASSERT_EQ(session.open(hislipResource(peer), 20000), VI_SUCCESS);
     std::thread waiting([&] { EXPECT_EQ(lockExclusively(session, VI_TMO_INFINITE), VI_ERROR_INV_OBJECT); });
     while (!asked)
         std::this_thread::yield();

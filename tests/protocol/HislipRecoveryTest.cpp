@@ -1,42 +1,23 @@
 // HiSLIP sessions after something went wrong: a clear that timed out, an interruption whose other half never comes, an
 // instrument that does not look at its input.
-#include "support/HislipPeer.h"
+#include "support/HislipConversation.h"
 #include "support/Stopwatch.h"
-#include "support/VisaSession.h"
 
 #include <atomic>
 #include <gtest/gtest.h>
 #include <thread>
 
 using test::acceptHislip;
+using test::converse;
 using test::hex;
 using test::HislipConnections;
+using test::hislipResource;
 using test::ScriptedPeer;
 using test::Stopwatch;
 using test::VisaSession;
 
 namespace
 {
-
-std::string resource(const ScriptedPeer &peer)
-{
-    return "TCPIP::127.0.0.1::hislip0," + std::to_string(peer.port()) + "::INSTR";
-}
-
-template <typename Script, typename User>
-void converse(Script script, User user)
-{
-    ScriptedPeer peer([&](ScriptedPeer &self) {
-        HislipConnections client = acceptHislip(self);
-        script(client);
-        client.sync.expectClosed();
-    });
-    VisaSession session;
-    ASSERT_EQ(session.open(resource(peer), 20000), VI_SUCCESS);
-    session.set(VI_ATTR_TMO_VALUE, 20000);
-    user(session);
-    EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
-}
 
 TEST(HislipRecovery, WriteBehindAClearThatTimedOutFinishesTheClearFirst)
 {

@@ -1,15 +1,16 @@
 // HiSLIP: what the instrument says, and the exact bytes that the library must have sent, from the tables of IVI-6.1.
-#include "support/HislipPeer.h"
+#include "support/HislipConversation.h"
 #include "support/Stopwatch.h"
-#include "support/VisaSession.h"
 
 #include <atomic>
 #include <gtest/gtest.h>
 #include <thread>
 
 using test::acceptHislip;
+using test::converse;
 using test::hex;
 using test::HislipConnections;
+using test::hislipResource;
 using test::PeerConnection;
 using test::ScriptedPeer;
 using test::Stopwatch;
@@ -17,28 +18,6 @@ using test::VisaSession;
 
 namespace
 {
-
-std::string resource(const ScriptedPeer &peer)
-{
-    return "TCPIP::127.0.0.1::hislip0," + std::to_string(peer.port()) + "::INSTR";
-}
-
-/// Runs @p script as the instrument and @p user on an open session.
-template <typename Script, typename User>
-void converse(Script script, User user)
-{
-    ScriptedPeer peer([&](ScriptedPeer &self) {
-        HislipConnections client = acceptHislip(self);
-        script(client);
-        client.sync.expectClosed();
-        client.async.expectClosed();
-    });
-    VisaSession session;
-    ASSERT_EQ(session.open(resource(peer), 20000), VI_SUCCESS);
-    session.set(VI_ATTR_TMO_VALUE, 20000);
-    user(session);
-    EXPECT_EQ(viClose(session.vi), VI_SUCCESS);
-}
 
 /// Behind a read that timed out without a byte: does another client hold a lock? Nobody does.
 void answerLockInfo(HislipConnections &client)
@@ -127,7 +106,7 @@ TEST(Hislip, KeepsEachMessageBelowTheInstrumentsSize)
         client.sync.expectClosed();
     });
     VisaSession session;
-    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(session.open(hislipResource(peer)), VI_SUCCESS);
     EXPECT_EQ(session.write("0123456789"), VI_SUCCESS);
     EXPECT_EQ(session.count, 10u);
     EXPECT_EQ(session.read(), VI_SUCCESS);
@@ -452,7 +431,7 @@ TEST(Hislip, KeepsAnswersInOverlappedMode)
         client.sync.expectClosed();
     });
     VisaSession session;
-    ASSERT_EQ(session.open(resource(peer), 20000), VI_SUCCESS);
+    ASSERT_EQ(session.open(hislipResource(peer), 20000), VI_SUCCESS);
     session.set(VI_ATTR_TMO_VALUE, 20000);
     EXPECT_EQ(session.get<ViUInt16>(VI_ATTR_TCPIP_HISLIP_OVERLAP_EN), VI_TRUE);
     ASSERT_EQ(session.write("1?\n"), VI_SUCCESS);
@@ -594,7 +573,7 @@ TEST(Hislip, HandlerMayCloseItsSession)
         client.async.expectClosed();
     });
     VisaSession session;
-    ASSERT_EQ(session.open(resource(peer)), VI_SUCCESS);
+    ASSERT_EQ(session.open(hislipResource(peer)), VI_SUCCESS);
     ASSERT_EQ(viInstallHandler(session.vi, VI_EVENT_SERVICE_REQ, onServiceRequest, &log), VI_SUCCESS);
     ASSERT_EQ(viEnableEvent(session.vi, VI_EVENT_SERVICE_REQ, VI_HNDLR, 0), VI_SUCCESS);
     session.write("go");
@@ -653,7 +632,7 @@ TEST_P(HislipRefusal, EndsTheOpenPromptly)
     });
     VisaSession session;
     const Stopwatch watch;
-    EXPECT_EQ(session.open(resource(peer), 30000), GetParam().expected);
+    EXPECT_EQ(session.open(hislipResource(peer), 30000), GetParam().expected);
     EXPECT_LT(watch.milliseconds(), 10000);
     EXPECT_EQ(session.vi, VI_NULL);
 }
@@ -690,7 +669,7 @@ TEST_P(HislipLateRefusal, EndsTheOpenPromptly)
     });
     VisaSession session;
     const Stopwatch watch;
-    EXPECT_EQ(session.open(resource(peer), 30000), GetParam().expected);
+    EXPECT_EQ(session.open(hislipResource(peer), 30000), GetParam().expected);
     EXPECT_LT(watch.milliseconds(), 10000);
     EXPECT_EQ(session.vi, VI_NULL);
 }
@@ -714,7 +693,7 @@ TEST(Hislip, SomethingElseAnswersOnThePort)
         client.expect(hex("48530201 00000000 0000000000000000")); // "bad header"
     });
     VisaSession session;
-    EXPECT_EQ(session.open(resource(peer), 30000), VI_ERROR_RSRC_NFOUND);
+    EXPECT_EQ(session.open(hislipResource(peer), 30000), VI_ERROR_RSRC_NFOUND);
 }
 
 TEST(Hislip, SilenceWhileOpeningEndsWithTheTimeOut)
@@ -726,7 +705,7 @@ TEST(Hislip, SilenceWhileOpeningEndsWithTheTimeOut)
     });
     VisaSession session;
     const Stopwatch watch;
-    EXPECT_EQ(session.open(resource(peer), 100), VI_ERROR_TMO);
+    EXPECT_EQ(session.open(hislipResource(peer), 100), VI_ERROR_TMO);
     EXPECT_GE(watch.milliseconds(), 100);
     EXPECT_LT(watch.milliseconds(), 10000);
 }
@@ -740,7 +719,7 @@ TEST(Hislip, OpenTimeOutOfZeroMeansTwoSeconds)
     });
     VisaSession session;
     const Stopwatch watch;
-    EXPECT_EQ(session.open(resource(peer), 0), VI_ERROR_TMO);
+    EXPECT_EQ(session.open(hislipResource(peer), 0), VI_ERROR_TMO);
     EXPECT_GE(watch.milliseconds(), 2000);
     EXPECT_LT(watch.milliseconds(), 15000);
 }
@@ -755,7 +734,7 @@ TEST(Hislip, ClosingTheResourceManagerEndsAnOpenThatHangs)
         client.expectClosed();
     });
     VisaSession session;
-    std::thread opener([&] { EXPECT_EQ(session.open(resource(peer), VI_TMO_INFINITE), VI_ERROR_INV_OBJECT); });
+    std::thread opener([&] { EXPECT_EQ(session.open(hislipResource(peer), VI_TMO_INFINITE), VI_ERROR_INV_OBJECT); });
     while (!hanging)
         std::this_thread::yield();
     EXPECT_EQ(viClose(session.rm), VI_SUCCESS);
